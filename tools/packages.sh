@@ -12,7 +12,7 @@
 # first one is what gets installed.
 package_group() {
     case $1 in
-        build) echo "cmake make ninja-build g++ libc6-dev" ;;
+        build) echo "cmake make g++ libc6-dev" ;;
         i686) echo "g++-multilib" ;;
         tests) echo "googletest python3 python3-pytest strace procps util-linux" ;;
         lint) echo "git python3 binutils clang-tidy clang-format shellcheck" ;;
