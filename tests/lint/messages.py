@@ -1,8 +1,7 @@
 #!/usr/bin/env python3
 """Messages: a text stands at one place, a number has one text, and a test names every number.
 
-The exceptions are tables in this file, each with its reason; a row that is no longer true is a
-problem too.
+The exceptions are rows of messages.txt; a row that is no longer true is a problem too.
 """
 import collections
 import re
@@ -12,20 +11,27 @@ from tree import Cpp, Problems, files, read, sources
 ID = re.compile(r"QVMRL\w*")
 WELL_FORMED = re.compile(r"QVMRL\d{4}[EIW]$")
 
-# Numbers with more than one text: administrators search for the number and find all of them.
-SEVERAL_TEXTS = {
-}
-
-# Texts that stand at more than one place.
-SEVERAL_PLACES = {
-}
-
-# Numbers that no test can bring about, and why.
-UNREACHABLE = {
-}
-
-HERE = "tests/lint/messages.py"
+TABLE = "tests/lint/messages.txt"
 problems = Problems()
+several_texts = {}   # number: how many
+several_places = {}  # (number, beginning of the text): how many
+unreachable = set()
+rows = {}            # number: line of a row
+for number, line in enumerate(open(TABLE, encoding="utf-8"), 1):
+    if not line.strip() or line.startswith("#"):
+        continue
+    row = re.match(r"(QVMRL\w+)\s+(?:(\d+) texts|(\d+) places of \"(.*)\"|unreachable: \S.*)$", line.strip())
+    if not row:
+        problems.add(TABLE, number, "a row is as the head of the file says")
+        continue
+    rows[row.group(1)] = number
+    if row.group(2):
+        several_texts[row.group(1)] = int(row.group(2))
+    elif row.group(3):
+        several_places[row.group(4)] = [int(row.group(3)), number, 0]
+    else:
+        unreachable.add(row.group(1))
+
 texts = collections.defaultdict(lambda: collections.defaultdict(list))
 names = sources()
 for name in names:
@@ -43,26 +49,27 @@ for name in files():
 
 for number, found in sorted(texts.items()):
     places = sorted(place for several in found.values() for place in several)
-    expected = SEVERAL_TEXTS.get(number, 1)
+    expected = several_texts.get(number, 1)
     if len(found) != expected:
         for text, several in found.items():
             problems.add(*several[0], f'{number} has {len(found)} texts instead of {expected}: "{text}"')
     for text, several in found.items():
-        if len(several) != SEVERAL_PLACES.get(text, 1):
+        allowed = several_places.get(text, [1, 0, 0])
+        allowed[2] = len(several)
+        if len(several) != allowed[0]:
             for place in several:
                 problems.add(*place, f'this text stands at {len(several)} places: "{text}"')
-    if number in UNREACHABLE:
-        continue
-    if number not in tested:
+    if number in tested and number in unreachable:
+        problems.add(TABLE, rows[number], f"{number} is unreachable here, and a test names it")
+    elif number not in tested and number not in unreachable:
         problems.add(*places[0], f"{number}: no test names it")
 
-everything = {text for found in texts.values() for text in found}
-for number in [*SEVERAL_TEXTS, *UNREACHABLE]:
+for number, line in rows.items():
     if number not in texts:
-        problems.add(HERE, 1, f"{number} is in a table here, and nowhere in the code")
-for text in SEVERAL_PLACES:
-    if text not in everything:
-        problems.add(HERE, 1, f'"{text}" is in a table here, and nowhere in the code')
+        problems.add(TABLE, line, f"{number} is nowhere in the code")
+for text, (_, line, seen) in several_places.items():
+    if not seen:
+        problems.add(TABLE, line, f'"{text}" is nowhere in the code')
 if not texts:
     problems.add("launcher", 1, "no message was found")
 problems.end()

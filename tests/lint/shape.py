@@ -12,10 +12,8 @@ FUNCTION_LINES = 60
 COLUMNS = 100
 
 # A walk over a text, character by character, is longer than a screen because cutting it would
-# hide its states. Nothing else is.
-LONG_WALKS = {
-    # "file": {"function", ...}
-}
+# hide its states. Those are listed with their reason; nothing else is.
+TABLE = "tests/lint/long_functions.txt"
 
 NO_HEADER = {"launcher/main.cpp"}  # nothing may call upward into it
 
@@ -25,7 +23,14 @@ BARE_RULER = re.compile(r"^[/*\s]*[-=*#~_/]{4,}[/*\s]*$")
 
 problems = Problems()
 names = set(sources())
-used = {}
+long_walks = {}  # (file, function): [line of the row, whether it was needed]
+for number, line in enumerate(open(TABLE, encoding="utf-8"), 1):
+    words = line.split(None, 2)
+    if words and not line.startswith("#"):
+        if len(words) != 3:
+            problems.add(TABLE, number, "a row is: file, function, the reason")
+            continue
+        long_walks[words[0], words[1]] = [number, False]
 for name in sorted(names):
     file = Cpp(name)
     lines = file.text.splitlines()
@@ -41,8 +46,8 @@ for name in sorted(names):
     for function, first, last in file.functions():
         if last - first + 1 <= FUNCTION_LINES:
             continue
-        if function in LONG_WALKS.get(name, ()):
-            used.setdefault(name, set()).add(function)
+        if (name, function) in long_walks:
+            long_walks[name, function][1] = True
             continue
         problems.add(name, first, f"{function} has {last - first + 1} lines, at most {FUNCTION_LINES}")
     for offset, comment in file.comments:
@@ -60,9 +65,9 @@ for name in sorted(names):
         if name[:-2] + ".cpp" not in names:
             problems.add(name, 1, "its source is missing")
 
-for name, functions in LONG_WALKS.items():
-    for function in sorted(functions - used.get(name, set())):
-        problems.add("tests/lint/shape.py", 1, f"{name}: {function} is not long: take it off the list")
+for (name, function), (number, needed) in long_walks.items():
+    if not needed:
+        problems.add(TABLE, number, f"{name}: {function} is not long: take it off the list")
 if not names:
     problems.add("launcher", 1, "no source was found")
 problems.end()
