@@ -1,8 +1,8 @@
 #!/bin/sh
 # C and C++ look as .clang-format says.
 set -u
-sources=$(find launcher platform diag tests bench demo \( -name '*.cpp' -o -name '*.h' -o -name '*.c' \) \
-    -type f 2>/dev/null | sort)
+sources=$(find . \( -path ./build -o -path ./.git \) -prune -o \
+    \( -name '*.cpp' -o -name '*.h' -o -name '*.c' \) -type f -print | sort)
 if [ -z "$sources" ] || [ ! -f .clang-format ]; then
     echo ".clang-format:1: there is nothing to compare with, or nothing to look at"
     exit 1

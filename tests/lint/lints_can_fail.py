@@ -103,6 +103,9 @@ CLEAN = {
     "tests/lint/messages.txt": "# none\n",
     "tests/lint/long_functions.txt": "# none\n",
     "tests/lint/promises.txt": "diag/log.cpp | an empty text | tell.CountsAnEmptyText\n",
+    "CONTRIBUTING.md": "| File | About |\n|---|---|\n| **diag/** | |\n| `log` | told |\n"
+                       "| **platform/linux/** | |\n| `files` | files |\n"
+                       "| **launcher/** | |\n| `startup` | order |\n| `main.cpp` | entry |\n",
     "check": "#!/bin/sh\necho fine\n",
     ".clang-format": "BasedOnStyle: LLVM\nIndentWidth: 4\nColumnLimit: 100\n"
                      "BreakBeforeBraces: Linux\nPointerAlignment: Left\nIncludeBlocks: Preserve\n"
@@ -221,6 +224,10 @@ BREAKAGES = [
     ("shape", "diag/clock.cpp", None, "int now();\n", r"clock\.cpp:1: its header is missing"),
     ("shape", "diag/log.h", "// What is told.\n", "", r"log\.h:1: a header begins"),
 
+    ("listing", "CONTRIBUTING.md", "| `files` | files |\n", "", r"files\.cpp:1: .*does not list it"),
+    ("listing", "CONTRIBUTING.md", "`files`", "`file`", r"CONTRIBUTING\.md:6: there is no platform/linux/file$"),
+    ("listing", "CONTRIBUTING.md", "", "", ""),
+
     ("shell", "check", "echo fine", "echo $1", r"check:2:\d+: note: .*SC2086"),
     ("format", "diag/log.cpp", "        ++told;", "  ++told;", r"log\.cpp:9:.*clang-format|log\.cpp:9:"),
     ("clang_tidy", "diag/log.cpp", "nullptr", "0", r"log\.cpp:9:.*modernize-use-nullptr"),
@@ -310,7 +317,7 @@ def check_breakage(name, path, old, new, expected):
     if name == "globals":
         build_objects()
     status, output = lint(name)
-    if (status == 0) != (expected == "") or not re.search(expected, output):
+    if (status == 0) != (expected == "") or not re.search(expected, output, re.M):
         failures.append(f"{name}: {path} was broken ({new!r}), status {status},"
                         f" expected {expected!r}, printed:\n{output}")
 
