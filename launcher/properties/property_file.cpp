@@ -1,0 +1,108 @@
+#include "launcher/properties/property_file.h"
+
+#include "diag/SvcDebug_linux.h"
+#include "launcher/properties/property_text.h"
+#include "platform/linux/files.h"
+
+#include <cstdio>
+#include <cwchar>
+
+// The property that is being built, over as many lines as it continues.
+struct PropertyParts {
+    std::wstring key;
+    std::wstring value;
+    bool inValue = false;
+    bool isXLine = false;
+    bool continued = false;
+};
+
+static bool isSeparator(wchar_t c)
+{
+    return c == L'=' || c == L':' || c == L' ' || c == L'\t';
+}
+
+// Adds the characters of one physical line.
+static void walkLine(const std::wstring& line, PropertyParts& parts)
+{
+    bool separatorAllowed = true;
+    for (std::wstring::size_type i = 0; i < line.size(); ++i) {
+        if (line[i] == L'\\') {
+            if (i + 1 == line.size()) {
+                parts.continued = true;
+                continue;
+            }
+            // Deliberate: the character behind the backslash is not shielded by it.
+            if (wcschr(L":# =", line[i + 1]) != nullptr)
+                ++i;
+        }
+        const wchar_t c = line[i];
+        if (c == L'\n')
+            continue;
+        if (separatorAllowed && isSeparator(c)) {
+            parts.inValue = true;
+            if (parts.isXLine)
+                parts.value += c;
+            continue;
+        }
+        if (!parts.inValue) {
+            parts.key += c;
+            continue;
+        }
+        if (c == L'\\' && i + 1 < line.size() && line[i + 1] == L'\\') {
+            // Both are kept for FilterValue.
+            parts.value += c;
+            ++i;
+        }
+        // Decision: what a trailing backslash has set is cleared here and nowhere else, so a
+        // property whose line ends in one goes on until a character of its value has come.
+        parts.continued = false;
+        separatorAllowed = false;
+        parts.value += c;
+    }
+}
+
+static void finishProperty(PropertyParts& parts, PropertyList& list)
+{
+    // Deliberate: the key is trimmed with a NUL at its end, so it loses leading spaces only.
+    parts.key += L'\0';
+    FilterProp(parts.key);
+    SvcDebugOutW(L"QVMRL0023I:   attrib = \"%s\"", parts.key.c_str());
+    FilterValue(parts.value);
+    SvcDebugOutW(L"QVMRL0024I:   value  = \"%s\"", parts.value.c_str());
+    appendProperty(list, parts.key, parts.value);
+}
+
+static void takeLine(const std::wstring& line, PropertyParts& parts, PropertyList& list)
+{
+    SvcDebugOutW(L"QVMRL0032I: Prop Line = \"%s\"", line.c_str());
+    // Decision: an empty line, and one that the locale cannot convert, yields no pair.
+    if (line.empty() || line[0] == L'#')
+        return;
+    if (!parts.continued) {
+        parts.key.clear();
+        parts.value.clear();
+        parts.inValue = false;
+        // Deliberate: a line of one character leaves the mark of the line before it.
+        if (line.size() >= 2)
+            parts.isXLine = line.compare(0, 2, L"-X") == 0;
+    }
+    walkLine(line, parts);
+    if (!parts.continued)
+        finishProperty(parts, list);
+}
+
+void getProperties(const std::wstring& path, PropertyList& list)
+{
+    FILE* file = nullptr;
+    open_file(file, path.c_str(), L"r");
+    if (file == nullptr) {
+        fatalErrorA("QVMRL0096E: Unable to load %ls file!", path.c_str(), EXIT_PROCESS, WITH_ERRNO);
+        return;
+    }
+    PropertyParts parts;
+    wchar_t line[LINE_ROOM];
+    while (feof(file) == 0 && readFile(file, L" %2024[^\n]\n", line) != EOF)
+        takeLine(line, parts, list);
+    // A property that still continues at the end of the file is never finished.
+    fclose(file);
+}

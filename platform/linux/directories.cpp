@@ -1,0 +1,138 @@
+#include "platform/linux/directories.h"
+
+#include "diag/SvcDebug_linux.h"
+#include "platform/linux/wide_strings.h"
+
+#include <cerrno>
+#include <dirent.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+bool createDirectory(const wchar_t* path)
+{
+    std::string narrowPath;
+    wcstochar(narrowPath, path);
+    return mkdir(narrowPath.c_str(), 0775) == 0;
+}
+
+bool mkdirs(const wchar_t* path)
+{
+    const std::wstring parts = path;
+    std::wstring soFar = L"/";
+    bool made = true;
+    std::wstring::size_type at = parts.find_first_not_of(L"/\\");
+    while (at != std::wstring::npos) {
+        const std::wstring::size_type end = parts.find_first_of(L"/\\", at);
+        soFar += parts.substr(at, end - at);
+        made = createDirectory(soFar.c_str());
+        soFar += L'/';
+        at = parts.find_first_not_of(L"/\\", end);
+    }
+    return made;
+}
+
+// Adds "<what><path>  - <reason>" to the report.
+static void reportFailure(std::string& report, const char* what, const std::string& path)
+{
+    std::string reason;
+    GetLastErrorMsg(reason);
+    report += what + path + "  - " + reason + "\n";
+}
+
+static bool removeEntry(const std::string& full, const char* name, const std::string& pattern,
+                        const std::string& indent, std::string& report)
+{
+    const bool everything = pattern == "*";
+    struct stat entry = {};
+    if (stat(full.c_str(), &entry) != 0) {
+        reportFailure(report, "Can't stat ", full);
+        return false;
+    }
+    if (!S_ISDIR(entry.st_mode)) {
+        if (!everything && std::string(name).find(pattern) == std::string::npos)
+            return true;
+        if (unlink(full.c_str()) == 0)
+            return true;
+        reportFailure(report, "Can't delete file ", full);
+        return false;
+    }
+    if (!everything)
+        return true;
+    bool ok = removeDirectoryContents(full, pattern, indent + "  ", report);
+    // A directory that could not be emptied is tried as well, and is in the report twice over.
+    if (rmdir(full.c_str()) != 0) {
+        reportFailure(report, "Can't delete dir ", full);
+        ok = false;
+    }
+    return ok;
+}
+
+bool removeDirectoryContents(const std::string& dir, const std::string& pattern,
+                             const std::string& indent, std::string& report)
+{
+    DIR* entries = opendir(dir.c_str());
+    if (entries == nullptr) {
+        reportFailure(report, "Error in ", dir);
+        return false;
+    }
+    bool ok = true;
+    errno = 0;
+    while (const struct dirent* entry = readdir(entries)) {
+        const std::string name = entry->d_name;
+        if (name != "." && name != ".." &&
+            !removeEntry(dir + "/" + name, name.c_str(), pattern, indent, report))
+            ok = false;
+        errno = 0;
+    }
+    if (errno != 0) {
+        reportFailure(report, "readdir error ", "");
+        ok = false;
+    }
+    closedir(entries);
+    return ok;
+}
+
+bool removeDirectoryContents(const std::string& dir, const std::string& indent, std::string& report)
+{
+    return removeDirectoryContents(dir, "*", indent, report);
+}
+
+bool removeDirectoryContents(const std::wstring& dir, std::wstring& errorText)
+{
+    std::string narrowDir;
+    wcstochar(narrowDir, dir.c_str());
+    std::string report;
+    const bool ok = removeDirectoryContents(narrowDir, "", report);
+    if (!ok)
+        chartowstr(report.c_str(), errorText);
+    return ok;
+}
+
+bool removeDirectoryAndContents(const std::wstring& dir, std::wstring& errorText)
+{
+    std::string narrowDir;
+    wcstochar(narrowDir, dir.c_str());
+    std::string report;
+    bool ok = removeDirectoryContents(narrowDir, "", report);
+    if (ok && rmdir(narrowDir.c_str()) != 0) {
+        reportFailure(report, "Can't delete dir ", narrowDir);
+        ok = false;
+    }
+    if (!ok)
+        chartowstr(report.c_str(), errorText);
+    return ok;
+}
+
+bool removeFileWithPatternFromDirectory(const std::wstring& dir, const std::wstring& pattern,
+                                        std::wstring& errorText)
+{
+    std::string narrowDir;
+    std::string narrowPattern;
+    wcstochar(narrowDir, dir.c_str());
+    wcstochar(narrowPattern, pattern.c_str());
+    std::string report;
+    const bool ok = removeDirectoryContents(narrowDir, narrowPattern, "", report);
+    if (!ok)
+        chartowstr(report.c_str(), errorText);
+    return ok;
+}

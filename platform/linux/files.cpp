@@ -1,0 +1,231 @@
+#include "platform/linux/files.h"
+
+#include "diag/SvcDebug_linux.h"
+#include "platform/linux/wide_strings.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <cwchar>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+bool exists(const wchar_t* path)
+{
+    if (path == nullptr)
+        return false;
+    std::string narrowPath;
+    wcstochar(narrowPath, path);
+    return existsA(narrowPath.c_str());
+}
+
+bool existsA(const char* path)
+{
+    if (path == nullptr)
+        return false;
+    const int fd = open(path, O_RDONLY | O_CLOEXEC);
+    if (fd < 0)
+        return false;
+    close(fd);
+    return true;
+}
+
+bool isDirectory(const wchar_t* path)
+{
+    if (path == nullptr)
+        return false;
+    std::string narrowPath;
+    wcstochar(narrowPath, path);
+    struct stat entry = {};
+    return lstat(narrowPath.c_str(), &entry) == 0 && S_ISDIR(entry.st_mode);
+}
+
+bool isExecutable(const wchar_t* path)
+{
+    if (path == nullptr)
+        return false;
+    std::string narrowPath;
+    wcstochar(narrowPath, path);
+    struct stat entry = {};
+    return stat(narrowPath.c_str(), &entry) == 0 && (entry.st_mode & S_IXUSR) != 0;
+}
+
+bool deleteFile(const wchar_t* path)
+{
+    std::string narrowPath;
+    wcstochar(narrowPath, path);
+    return unlink(narrowPath.c_str()) == 0;
+}
+
+bool moveFile(const wchar_t* from, const wchar_t* to)
+{
+    std::string narrowFrom;
+    std::string narrowTo;
+    wcstochar(narrowFrom, from);
+    wcstochar(narrowTo, to);
+    return rename(narrowFrom.c_str(), narrowTo.c_str()) == 0;
+}
+
+bool symlink(const wchar_t* target, const wchar_t* link)
+{
+    std::string narrowTarget;
+    std::string narrowLink;
+    wcstochar(narrowTarget, target);
+    wcstochar(narrowLink, link);
+    return ::symlink(narrowTarget.c_str(), narrowLink.c_str()) == 0;
+}
+
+// Copies text until `in` ends. Returns the message that a failure ends the process with.
+static const char* copyText(FILE* in, FILE* out)
+{
+    static const int PIECE = 1001;
+    wchar_t piece[PIECE];
+    while (fgetws(piece, PIECE, in) != nullptr) {
+        if (fputws(piece, out) < 0)
+            return "QVMRL0192E: Encountered error copying file contents";
+    }
+    // Decision: a directory, or bytes that the locale cannot decode, end here.
+    if (feof(in) == 0)
+        return "QVMRL0193E: Did not encounter EOF while copying file contents";
+    // What was written so far is in the stream's buffer; a full disk shows only now.
+    if (fflush(out) != 0)
+        return "QVMRL0192E: Encountered error copying file contents";
+    return nullptr;
+}
+
+void copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
+{
+    FILE* in = nullptr;
+    open_wfile(in, from, L"r");
+    if (in == nullptr) {
+        fatalErrorA("QVMRL0190E: Unable to open source file %ls to be copied", from, EXIT_PROCESS,
+                    WITH_ERRNO);
+        return;
+    }
+    FILE* out = openNewFile(place, to, L"w+");
+    if (out == nullptr) {
+        const int reason = errno;
+        fclose(in);
+        errno = reason;
+        fatalErrorA("QVMRL0191E: Unable to open destination file %ls to be copied to", to,
+                    EXIT_PROCESS, WITH_ERRNO);
+        return;
+    }
+    const char* trouble = copyText(in, out);
+    if (trouble == nullptr && place != to && !flushToDisk(out))
+        trouble = "QVMRL0192E: Encountered error copying file contents";
+    const int reason = errno;
+    fclose(in);
+    fclose(out);
+    if (trouble == nullptr)
+        return;
+    if (place != to)
+        deleteFile(place.c_str());
+    errno = reason;
+    fatalErrorA(trouble, EXIT_PROCESS, WITH_ERRNO);
+}
+
+bool copyFile(const wchar_t* from, const wchar_t* to)
+{
+    std::wstring place = to;
+    copyFileAside(from, place, to);
+    return true;
+}
+
+// Decision: a file that is believed for ever once it stands is written aside and renamed, so that
+// a launcher killed half-way leaves nothing that a later start believes. When something stands at
+// the target (a dangling link, a file that cannot be read) it is written straight.
+std::wstring placeForNewFile(const std::wstring& target)
+{
+    std::string narrowTarget;
+    wcstochar(narrowTarget, target.c_str());
+    struct stat entry = {};
+    if (lstat(narrowTarget.c_str(), &entry) == 0 || errno != ENOENT)
+        return target;
+    return target + L".part";
+}
+
+FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mode)
+{
+    FILE* file = nullptr;
+    open_wfile(file, place.c_str(), mode);
+    if (file == nullptr && place != target) {
+        // Something is in the way of the place aside; the reason that counts is the target's.
+        place = target;
+        open_wfile(file, target, mode);
+    }
+    return file;
+}
+
+bool publishNewFile(const std::wstring& place, const std::wstring& target)
+{
+    return place == target || moveFile(place.c_str(), target.c_str());
+}
+
+bool copyNewFile(const wchar_t* from, const wchar_t* to)
+{
+    std::wstring place = placeForNewFile(to);
+    copyFileAside(from, place, to);
+    return publishNewFile(place, to);
+}
+
+static void openStream(FILE*& fp, const wchar_t* path, const wchar_t* mode, int orientation)
+{
+    std::string narrowPath;
+    std::string narrowMode;
+    wcstochar(narrowPath, path);
+    wcstochar(narrowMode, mode);
+    narrowMode += 'e';
+    fp = fopen(narrowPath.c_str(), narrowMode.c_str());
+    if (fp != nullptr)
+        fwide(fp, orientation);
+}
+
+void open_file(FILE*& fp, const wchar_t* path, const wchar_t* mode)
+{
+    openStream(fp, path, mode, -1);
+}
+
+void open_wfile(FILE*& fp, const wchar_t* path, const wchar_t* mode)
+{
+    openStream(fp, path, mode, 1);
+}
+
+void open_prop_file(FILE*& fp, const char* path, const char* mode)
+{
+    fp = fopen(path, (std::string(mode) + 'e').c_str());
+}
+
+int readFile(FILE* fp, const wchar_t* format, wchar_t* out)
+{
+    // Never cleared as a whole: that would cost more than all the rest of a start.
+    static char work[819200];
+    work[0] = '\0';
+    std::string narrowFormat;
+    wcstochar(narrowFormat, format);
+    const int result = fscanf(fp, narrowFormat.c_str(), work);
+    // Decision: a read that matched nothing hands over an empty line.
+    wchar_t* text = chartowcs(work);
+    wcscpy(out, text);
+    freeString(text);
+    return result;
+}
+
+bool readCopiedLine(FILE* fp, wchar_t* out)
+{
+    while (feof(fp) == 0) {
+        const int result = readFile(fp, L"%2024[^\n]\n", out);
+        if (result != 0)
+            return result != EOF;
+        // Decision: only a line end at the very head of the file matches nothing. It is swallowed
+        // with what follows, as behind any other line; the copy neither ends nor hangs there.
+        readFile(fp, L"\n", out);
+    }
+    return false;
+}
+
+bool flushToDisk(FILE* fp)
+{
+    return fflush(fp) == 0 && fsync(fileno(fp)) == 0;
+}

@@ -1,0 +1,330 @@
+#include "platform/linux/lock_file.h"
+
+#include "diag/SvcDebug_linux.h"
+#include "diag/time_stamps.h"
+#include "platform/linux/argument_vector.h"
+#include "platform/linux/files.h"
+#include "platform/linux/paths.h"
+#include "platform/linux/process.h"
+#include "platform/linux/wide_strings.h"
+
+#include <cerrno>
+#include <climits>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cwchar>
+#include <cwctype>
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+static FILE* lockFILE = nullptr;
+static long pid = 0;
+static std::wstring lockFilePath;
+static std::wstring pipeFilePath;
+static std::wstring mainPidFilePath;
+static std::wstring pipename;
+static bool runningLock = false;
+static bool bWaitMode = false;
+static bool bDirtyShutdown = false;
+
+static std::wstring controlFile(const std::wstring& workspace, const wchar_t* name)
+{
+    std::wstring path = workspace + L"/" + name;
+    convertToOsSeparator(path);
+    return path;
+}
+
+// The old platform's number; 0, which no platform has, when the words do not give it.
+static long oldPlatformPid(int argc, wchar_t** argv)
+{
+    const int option = findOption(L"-rcp_old_pid", argc, argv);
+    if (option < 0 || option + 1 >= argc)
+        return 0;
+    return wcstol(argv[option + 1], nullptr, 10);
+}
+
+// Decision: without a readable old number a live platform ends the wait at once, and this start
+// becomes a daemon process.
+static void waitForOldPlatform(long oldPid, const std::wstring& exeName)
+{
+    sysSleep(1);
+    int seconds = 1;
+    while (isMainProcessRunning(exeName)) {
+        if (pid != oldPid)
+            return;
+        sysSleep(1);
+        ++seconds;
+        if (seconds > 19) {
+            SvcDebugOutA("QVMRL0013E: Existing platform has not shutdown within allotted time. "
+                         "Invalidating the lockfile for new launch.");
+            invalidateLockFile();
+        }
+    }
+}
+
+// Decision: tracing stays forced on while the lock is taken, so a fatal end in here leaves its
+// lines in the time-stamped log.
+void locateLockFile(int argc, wchar_t** argv, const std::wstring& workspace,
+                    const std::wstring& exeName)
+{
+    lockFilePath = controlFile(workspace, L".rcp.lock");
+    pipeFilePath = controlFile(workspace, L".pipe");
+    mainPidFilePath = controlFile(workspace, L".rcp.main");
+    const ForcedTrace forced;
+    createAndOpenLockFile();
+    if (findOption(L"-restart", argc, argv) >= 0)
+        waitForOldPlatform(oldPlatformPid(argc, argv), exeName);
+    lockLockFile(controlFile(workspace, L".sid"), exeName);
+}
+
+void createAndOpenLockFile()
+{
+    std::string path;
+    wcstochar(path, lockFilePath.c_str());
+    const int fd = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
+    if (fd < 0) {
+        const int reason = errno;
+        const ForcedTrace forced;
+        SvcDebugOutA("QVMRL0199E: CreateLockFile failed. errno=%d", reason);
+    } else {
+        close(fd);
+    }
+    // The platform inherits this stream's descriptor: when the launcher is killed before it has
+    // recorded the platform, the lock stays with the platform and no second one can start.
+    lockFILE = fopen(path.c_str(), "r+");
+    if (lockFILE == nullptr) {
+        fatalErrorA("QVMRL0054E: Error locating platform lock file", EXIT_PROCESS, WITH_ERRNO);
+        return;
+    }
+    fwide(lockFILE, -1);
+}
+
+void lockLockFile(const std::wstring& sidPath, const std::wstring& exeName)
+{
+    while (flock(fileno(lockFILE), LOCK_EX) != 0) {
+        if (errno != EINTR) {
+            fatalErrorA("QVMRL0053E: Error locking platform lock file. ", EXIT_PROCESS, WITH_ERRNO);
+            return;
+        }
+    }
+    std::wstring now;
+    getTimeString(now);
+    SvcDebugOutW(L"QVMRL0303I: lock file captured @ %s", now.c_str());
+    if (isMainProcessRunning(exeName)) {
+        SvcDebugOutA("QVMRL0305I: We are daemon process");
+        return;
+    }
+    SvcDebugOutA("QVMRL0304I: We are main process");
+    setMainProcess(true);
+    if (exists(sidPath.c_str())) {
+        bDirtyShutdown = true;
+        deleteFile(sidPath.c_str());
+    }
+}
+
+void unlockLockFile()
+{
+    const bool released = flock(fileno(lockFILE), LOCK_UN) == 0;
+    const int reason = errno;
+    std::wstring now;
+    getTimeString(now);
+    {
+        const ForcedTrace forced;
+        SvcDebugOutW(L"QVMRL0306I: lock file released @ %s", now.c_str());
+    }
+    if (!released) {
+        errno = reason;
+        fatalErrorA("QVMRL0070E: Error unlocking platform lock file. ", EXIT_PROCESS, WITH_ERRNO);
+    }
+}
+
+// Writes `text` over the start of the lock file. False when it did not get there.
+static bool rewriteLockFile(const std::string& text)
+{
+    rewind(lockFILE);
+    const bool written = fputs(text.c_str(), lockFILE) >= 0;
+    return fflush(lockFILE) == 0 && written;
+}
+
+void invalidateLockFile()
+{
+    if (rewriteLockFile("              "))
+        return;
+    const ForcedTrace forced;
+    SvcDebugOutA("QVMRL0052E: Unable to invalidate platform lock file");
+}
+
+void populateLockFile(int childPid)
+{
+    if (!isMainProcess())
+        return;
+    populateMainPidFile(static_cast<unsigned long>(childPid));
+    if (rewriteLockFile(std::to_string(childPid) + "          "))
+        return;
+    const ForcedTrace forced;
+    SvcDebugOutA("QVMRL0051E: Unable to write to platform lock file");
+}
+
+void populateMainPidFile(unsigned long mainPid)
+{
+    const ForcedTrace forced;
+    FILE* file = nullptr;
+    open_file(file, mainPidFilePath.c_str(), L"w+");
+    if (file == nullptr) {
+        // Deliberate: the two identifiers below carry a literal XX.
+        SvcDebugOutA("QVMRL00XXI: Unable to open rcp.main file");
+        return;
+    }
+    const bool written = fprintf(file, "%lu    ", mainPid) >= 0;
+    if (fflush(file) != 0 || !written)
+        SvcDebugOutA("QVMRL00XXI: Unable to write pid to rcp.main file");
+    fclose(file);
+}
+
+static bool isPlainNameCharacter(wchar_t c)
+{
+    return (c < 128 && iswalnum(static_cast<wint_t>(c)) != 0) || wcschr(L"._-+/", c) != nullptr;
+}
+
+// `name` as one word of the shell.
+static std::string shellWord(const std::wstring& name)
+{
+    bool plain = true;
+    std::wstring quoted = L"'";
+    for (const wchar_t c : name) {
+        plain = plain && isPlainNameCharacter(c);
+        if (c == L'\'')
+            quoted += L"'\\''";
+        else
+            quoted += c;
+    }
+    std::string word;
+    wcstochar(word, plain ? name.c_str() : (quoted + L"'").c_str());
+    return word;
+}
+
+// Decision: the command has room for 99 bytes; a name that is too long is cut, and still found by
+// what is left of it. A name with characters that mean something to the shell is quoted: it is a
+// pattern for grep, never a command.
+static std::string platformTest(std::wstring exeName)
+{
+    static const size_t LONGEST_COMMAND = 99;
+    const std::string start = "ps h " + std::to_string(pid) + " | grep ";
+    const std::string end = " 2>&1 1>/dev/null";
+    std::string name = shellWord(exeName);
+    while (start.size() + name.size() + end.size() > LONGEST_COMMAND && !exeName.empty()) {
+        exeName.pop_back();
+        name = shellWord(exeName);
+    }
+    return start + name + end;
+}
+
+// True when the process `pid` lives and is the platform.
+static bool isPlatformProcess(const std::wstring& exeName)
+{
+    // A number that no process can have is a dead one, also where pid_t is narrower than long.
+    if (pid > INT_MAX || pid < -INT_MAX)
+        return false;
+    if (kill(static_cast<pid_t>(pid), 0) != 0 && errno == ESRCH)
+        return false;
+    // The shell is required here: packages depend on ps.
+    const int status = system(platformTest(exeName).c_str());
+    return status != -1 && WIFEXITED(status) && WEXITSTATUS(status) == 0;
+}
+
+bool isMainProcessRunning(const std::wstring& exeName)
+{
+    if (!exists(lockFilePath.c_str()))
+        return false;
+    const ForcedTrace forced;
+    SvcDebugOutA("QVMRL0090E: Existing platform lock file found - checking validity.");
+    // Decision: each look sees the file as it is now. A stream keeps its buffer across a seek, so
+    // the buffer is dropped first; otherwise a restart would wait for the old number for ever.
+    fflush(lockFILE);
+    rewind(lockFILE);
+    switch (fscanf(lockFILE, "%ld", &pid)) {
+    case EOF:
+        SvcDebugOutA("QVMRL0091E: No data in the platform lock file.");
+        return false;
+    case 1:
+        return isPlatformProcess(exeName);
+    default:
+        fatalErrorA("QVMRL0092E: Error reading platform lock file.", EXIT_PROCESS, WITH_ERRNO);
+        return false;
+    }
+}
+
+long getPlatformPid()
+{
+    return pid;
+}
+
+void getLockFilePath(std::wstring& path)
+{
+    path = lockFilePath;
+}
+
+void getPipeFilePath(std::wstring& path)
+{
+    path = pipeFilePath;
+}
+
+void getMainPidFilePath(std::wstring& path)
+{
+    path = mainPidFilePath;
+}
+
+bool getPipeName(std::wstring& name)
+{
+    if (pipename.empty() && exists(pipeFilePath.c_str())) {
+        FILE* file = nullptr;
+        open_file(file, pipeFilePath.c_str(), L"r");
+        if (file == nullptr)
+            return false;
+        wchar_t line[LINE_ROOM];
+        readFile(file, L" %2024[^\n]\n", line);
+        fclose(file);
+        pipename = line;
+        name = pipename;
+        return true;
+    }
+    name = pipename;
+    return !pipename.empty();
+}
+
+void setMainProcess(bool isMain)
+{
+    runningLock = isMain;
+}
+
+bool isMainProcess()
+{
+    return runningLock;
+}
+
+void setWaitMode()
+{
+    bWaitMode = true;
+}
+
+bool isWaitMode()
+{
+    return bWaitMode;
+}
+
+bool isDirtyShutdown()
+{
+    return bDirtyShutdown;
+}
+
+bool isPipeDaemonCommand()
+{
+    return false;
+}
+
+void getCmdString()
+{
+}

@@ -1,0 +1,108 @@
+#include "platform/linux/shutdown_log.h"
+
+#include "diag/SvcDebug_linux.h"
+#include "platform/linux/files.h"
+#include "platform/linux/paths.h"
+#include "platform/linux/wide_strings.h"
+
+#include <cstdio>
+#include <ctime>
+#include <cwchar>
+
+static const int LONGEST_HISTORY = 200;
+static const wchar_t* const LINE_FORMAT = L"%2024[^\n]\n";
+
+static std::wstring historyPath(const std::wstring& logDir)
+{
+    std::wstring path = logDir + L"/shutdown.log";
+    convertToOsSeparator(path);
+    return path;
+}
+
+void doShutdownLogUpdate(const std::wstring& workspace)
+{
+    std::wstring logDir;
+    getLogLocation(logDir, workspace);
+    updateShutdownLog(logDir);
+    truncateShutdownLog(logDir);
+}
+
+void updateShutdownLog(const std::wstring& logDir)
+{
+    const time_t now = time(nullptr);
+    struct tm local = {};
+    localtime_r(&now, &local);
+    char text[64] = "";
+    std::wstring started;
+    chartowstr(asctime_r(&local, text), started);
+
+    const std::wstring path = historyPath(logDir);
+    FILE* file = nullptr;
+    open_wfile(file, path.c_str(), L"a+");
+    if (file == nullptr) {
+        fatalErrorA("QVMRL0098E: Could not open %ls for writing!", path.c_str(), EXIT_PROCESS,
+                    WITH_ERRNO);
+        return;
+    }
+    if (fwprintf(file, L"Started %ls", started.c_str()) < 0 || fflush(file) != 0)
+        fatalErrorA("QVMRL0118E: Error writing to %ls file.", path.c_str(), EXIT_PROCESS,
+                    WITH_ERRNO);
+    fclose(file);
+}
+
+static int countLines(FILE* file)
+{
+    wchar_t line[LINE_ROOM];
+    int lines = 0;
+    while (feof(file) == 0 && readFile(file, LINE_FORMAT, line) == 1)
+        ++lines;
+    return lines;
+}
+
+// Copies the lines from number `first` on (the first line is 1). False when a write failed.
+static bool copyLinesFrom(int first, FILE* from, FILE* to)
+{
+    wchar_t line[LINE_ROOM];
+    for (int number = 1; feof(from) == 0 && readFile(from, LINE_FORMAT, line) == 1; ++number) {
+        if (number >= first && fwprintf(to, L"%ls\n", line) < 0)
+            return false;
+    }
+    return fflush(to) == 0;
+}
+
+void truncateShutdownLog(const std::wstring& logDir)
+{
+    const std::wstring path = historyPath(logDir);
+    const ForcedTrace forced;
+    FILE* history = nullptr;
+    open_file(history, path.c_str(), L"r");
+    if (history == nullptr) {
+        SvcDebugOutW(L"QVMRL0138E: Unable to open file.\"%s\"", path.c_str());
+        return;
+    }
+    const int lines = countLines(history);
+    if (lines < LONGEST_HISTORY) {
+        fclose(history);
+        return;
+    }
+    const std::wstring newPath = path + L".new";
+    FILE* kept = nullptr;
+    open_wfile(kept, newPath.c_str(), L"w");
+    if (kept == nullptr) {
+        SvcDebugOutW(L"QVMRL0105E: Unable to open file for writing.\"%s\"", newPath.c_str());
+        fclose(history);
+        return;
+    }
+    rewind(history);
+    // Deliberate: from the hundredth line before the last one on, which keeps 101 lines.
+    const bool copied = copyLinesFrom(lines - 100, history, kept);
+    fclose(history);
+    fclose(kept);
+    if (!copied) {
+        SvcDebugOutW(L"QVMRL0137E: Error while truncating file.\"%s\"", path.c_str());
+        deleteFile(newPath.c_str());
+        return;
+    }
+    deleteFile(path.c_str());
+    moveFile(newPath.c_str(), path.c_str());
+}
