@@ -29,6 +29,11 @@ MAIN = WORKSPACE + "/.rcp.main"
 LOG = WORKSPACE + "/logs/velmora.log"
 TEMP_LOG = "/tmp/velmora.log"
 
+# Pieces of the commands that are built.
+HEAD = [ECLIPSE, "--launcher.suppressErrors"]
+STARTUP = ["-startup", BASE + "/launcher.jar", "-vmargs"]
+INSTALL_AREA = ["-Drcp.osgi.install.area=/mnt/app/rcp/eclipse"]
+
 RECORDS = "/dev/shm/stand-in"
 # Options for sanitizers and coverage reach the launcher, and are taken out of what a platform was given.
 FOR_THE_BUILD = ("ASAN_OPTIONS", "LSAN_OPTIONS", "UBSAN_OPTIONS", "GCOV_PREFIX", "GCOV_PREFIX_STRIP")
@@ -46,6 +51,17 @@ def read_bytes(path):
 def lines(*texts):
     """The texts, each with a line end."""
     return "".join(text + "\n" for text in texts)
+
+
+def areas(workspace=WORKSPACE):
+    """The words that name the user's area to the platform."""
+    return ["-data", workspace, "-configuration", workspace + "/.config"]
+
+
+def system(workspace=WORKSPACE, configuration="user"):
+    """The system properties in front of those of the installation."""
+    return ["-Drcp.home=/mnt/app", "-Drcp.data=" + workspace, "-Dcom.vantor.rcp.install.id=abc",
+            "-Drcp.install.config=" + configuration]
 
 
 def untimed(text):
@@ -299,14 +315,21 @@ class World:
         return not [pid for pid in self.strangers() if pid not in recorded
                     and _state(pid) not in (None, "Z", "X") and not _executable(pid).endswith("/strace")]
 
-    def fatal(self, start, line, log=None):
-        """The start ended with status 255 before anything was started, and `line` is the last one of its log: the one
-        in the user's area when there is one (or `log`), else the only one in /tmp."""
+    def fatal(self, start, message, reason=None):
+        """The start ended with status 255 and nothing was started; the last line of its log is the message and, after
+        it, the system's reason: the given one, or any where no call of the system has failed. The log is the one in the
+        user's area when there is one, else the one in /tmp."""
         assert (start.status, self.platforms()) == (255, [])
-        if log is None and os.path.exists(LOG):
-            log = LOG
-        text = read(log) if log else self.temp_log()
-        assert text.splitlines()[-1] == line
+        found = user_logs() or temp_logs()
+        assert len(found) == 1, found
+        line, last = read(found[0]), "\n" if found == user_logs() else "\n\n"
+        assert line.endswith(last)
+        line = line[:-len(last)].rpartition("\n")[2]
+        if reason is None:
+            assert line.startswith(message + " : ")
+            assert line[len(message) + 3:] in map(os.strerror, range(134))
+        else:
+            assert line == message + " : " + reason
 
     def temp_log(self):
         """The only log in /tmp, whatever its name."""
@@ -320,7 +343,13 @@ class World:
 
 
 def temp_logs():
-    return sorted(map(str, pathlib.Path("/tmp").glob("velmora*")))
+    """The logs in /tmp; held lines that are saved there are followed by an empty line."""
+    return sorted(map(str, pathlib.Path("/tmp").glob("velmora*.log")))
+
+
+def user_logs():
+    """The logs in all user areas."""
+    return sorted(str(path) for path in pathlib.Path("/mnt").rglob("velmora*.log") if path.parent.name == "logs")
 
 
 def tree(top):
