@@ -29,8 +29,7 @@
 struct StartupRun {
     StartupRun(int count, wchar_t** words, std::vector<std::wstring>& launchArgs)
         : rawArgc(count), rawArgv(words), command(launchArgs)
-    {
-    }
+    {}
 
     // The words are borrowed from the lists, so the lists go last.
     ~StartupRun()
@@ -171,9 +170,8 @@ static void recordStartupArguments(const StartupRun& run)
 static void createUserCopies(StartupRun& run)
 {
     createConfigIni(run.configuration, run.baseLocation);
-    run.userPropsPath =
-        createRCPInstallProps(run.workspace, run.configuration, run.baseLocation, run.installDir,
-                              run.launcherProps);
+    run.userPropsPath = createRCPInstallProps(run.workspace, run.configuration, run.baseLocation,
+                                              run.installDir, run.launcherProps);
 }
 
 static void readUserProperties(StartupRun& run)

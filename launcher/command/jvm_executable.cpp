@@ -99,8 +99,8 @@ static const wchar_t* givenVm(const PropertyList& props, int argc, wchar_t** arg
 bool addVmToCommandLine(const PropertyList& props, const PropertyList& launcherProps, int argc,
                         wchar_t** argv)
 {
-    const bool console = findOption(L"-console", argc, argv) >= 0 ||
-                         findOption(L"-consoleLog", argc, argv) >= 0;
+    const bool console =
+        findOption(L"-console", argc, argv) >= 0 || findOption(L"-consoleLog", argc, argv) >= 0;
     if (findOption(L"-velmoraWait", argc, argv) >= 0)
         setWaitMode();
     const wchar_t* given = givenVm(props, argc, argv);

@@ -27,9 +27,7 @@ void addArgToCommandLine(const std::wstring& arg, bool /*ignored*/)
     launchArgs.push_back(arg);
 }
 
-void setSemVersion(wchar_t* /*ignored*/)
-{
-}
+void setSemVersion(wchar_t* /*ignored*/) {}
 
 char** newExecArguments(const std::vector<std::wstring>& args, const char* begin, const char* end)
 {
@@ -53,6 +51,6 @@ char** newExecArguments(const std::vector<std::wstring>& args, const char* begin
 void freeExecArguments(char** args)
 {
     for (char** word = args; *word != nullptr; ++word)
-        delete[] *word;
+        delete[] * word;
     delete[] args;
 }

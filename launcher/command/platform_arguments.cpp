@@ -22,8 +22,7 @@ struct OptionPositions {
           passedPairs{findOption(L"-plugincustomization", argc, argv),
                       findOption(L"-application", argc, argv), findOption(L"-product", argc, argv),
                       findOption(L"-personality", argc, argv)}
-    {
-    }
+    {}
 
     const std::array<int, 4> droppedPairs;
     const std::array<int, 2> droppedSingles;

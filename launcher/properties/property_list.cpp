@@ -39,8 +39,8 @@ wchar_t* findProperty(const wchar_t* key, const PropertyList& list)
 // the same line as a failure to begin.
 static wchar_t** resizeFound(wchar_t** found, size_t count)
 {
-    auto** room = static_cast<wchar_t**>(
-        realloc(static_cast<void*>(found), (count + 1) * sizeof(wchar_t*)));
+    auto** room =
+        static_cast<wchar_t**>(realloc(static_cast<void*>(found), (count + 1) * sizeof(wchar_t*)));
     if (room == nullptr)
         fatalErrorA("QVMRL0046E: findProperties malloc for property strings failed!", EXIT_PROCESS,
                     WITH_ERRNO);

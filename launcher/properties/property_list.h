@@ -33,8 +33,7 @@ wchar_t** findProperties(const wchar_t* prefix, const PropertyList& list);
 struct FoundProperties {
     FoundProperties(const wchar_t* prefix, const PropertyList& list)
         : pairs(findProperties(prefix, list))
-    {
-    }
+    {}
     ~FoundProperties()
     {
         free(static_cast<void*>(pairs));

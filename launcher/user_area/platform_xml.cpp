@@ -65,7 +65,8 @@ static bool fillIn(std::wstring& line, const Feature& feature, const PropertyLis
 static void logFailedWrite()
 {
     const ForcedTrace forced;
-    SvcDebugOutA("QVMRL0103E: Error while copying platform.xml to user specific platform.xml file.");
+    SvcDebugOutA(
+        "QVMRL0103E: Error while copying platform.xml to user specific platform.xml file.");
 }
 
 // Deliberate: after a missing value the lines so far stay, and are believed by later starts.

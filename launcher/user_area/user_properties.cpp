@@ -140,7 +140,8 @@ static void appendBlock(const std::wstring& block, FILE* to)
     if (fputws(formatOfItself(block).c_str(), to) >= 0 && flushToDisk(to))
         return;
     const ForcedTrace forced;
-    SvcDebugOutA("QVMRL0015E: Unable to append values to user specific rcpinstall.properties file.");
+    SvcDebugOutA(
+        "QVMRL0015E: Unable to append values to user specific rcpinstall.properties file.");
 }
 
 int fixUserRCPInstallProperties(const std::wstring& /*workspaceDir*/, std::wstring& userPath,

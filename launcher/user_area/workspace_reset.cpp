@@ -100,7 +100,8 @@ bool handleDirMove(const std::wstring& dst, const std::wstring& src, bool mustEx
     return handleCopy(dst, L"", src, L"", mustExist, MOVE);
 }
 
-static void saveRegistryAndBookmarks(const std::wstring& workspaceDir, const std::wstring& updateDir)
+static void saveRegistryAndBookmarks(const std::wstring& workspaceDir,
+                                     const std::wstring& updateDir)
 {
     handleCopy(workspaceDir, L"registry.old", updateDir, L"registry", OPTIONAL, COPY);
     handleCopy(workspaceDir, L"bookmarks.xml.old", updateDir, L"bookmarks.xml", OPTIONAL, COPY);

@@ -3,9 +3,9 @@
 #define PLATFORM_LINUX_CHILD_PROCESS_H
 
 enum ChildOutcome {
-    CHILD_STARTED,     // in the parent: the child has been executed, or could not be and will end
-    CHILD_NOT_FORKED,  // in the parent: there is no child
-    IN_FAILED_CHILD    // in the child, which is still the launcher: args[0] could not be executed
+    CHILD_STARTED,    // in the parent: the child has been executed, or could not be and will end
+    CHILD_NOT_FORKED, // in the parent: there is no child
+    IN_FAILED_CHILD   // in the child, which is still the launcher: args[0] could not be executed
 };
 
 struct ChildStart {

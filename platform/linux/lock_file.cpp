@@ -325,6 +325,4 @@ bool isPipeDaemonCommand()
     return false;
 }
 
-void getCmdString()
-{
-}
+void getCmdString() {}
