@@ -66,10 +66,12 @@ example_build() {
     cc "${strict[@]}" ${width:+"$width"} -shared -fPIC -o "$pieces/lockdown.so" \
         "$EXAMPLE_SOURCES/lockdown.c" || return
 
+    # Without their performance data the tools leave nothing in /tmp.
     local application=$EXAMPLE_SOURCES/application
-    "$jdk/bin/javac" -Xlint:all -Werror --release 11 -cp "${class_path#:}" -d "$pieces/classes" \
+    "$jdk/bin/javac" -J-XX:-UsePerfData -Xlint:all -Werror --release 11 \
+        -cp "${class_path#:}" -d "$pieces/classes" \
         "$application"/src/velmora/demo/*.java || return
-    "$jdk/bin/jar" --create --file "$pieces/velmora-demo.jar" \
+    "$jdk/bin/jar" -J-XX:-UsePerfData --create --file "$pieces/velmora-demo.jar" \
         --manifest "$application/META-INF/MANIFEST.MF" \
         -C "$application" plugin.xml -C "$pieces/classes" .
 }
