@@ -22,6 +22,7 @@ fi
 mount -t tmpfs none /mnt &&
     mkdir -p /mnt/app /mnt/home /mnt/logs &&
     cp -R example/platform/. /mnt/app/ &&
+    cp tests/full/valgrind.supp /mnt/ &&
     cp build/native/velmora /mnt/app/rcp/velmora || exit 1
 cd /mnt || exit 1
 mount -t tmpfs none /tmp || exit 1
@@ -60,7 +61,7 @@ start() {
     shift 2
     rm -f /mnt/words
     env -i HOME=/mnt/home USER=anna PATH="$PATH" LC_ALL=C.UTF-8 \
-        valgrind --quiet --leak-check=full --errors-for-leak-kinds=definite,indirect \
+        valgrind --quiet --suppressions=/mnt/valgrind.supp --leak-check=full --errors-for-leak-kinds=definite,indirect \
         --show-leak-kinds=definite,indirect --error-exitcode=99 --log-file="/mnt/logs/$name.%p" \
         /mnt/app/rcp/velmora "$@" </dev/null
     status=$?

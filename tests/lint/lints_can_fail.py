@@ -144,7 +144,7 @@ BREAKAGES = [
      r"diag/log\.cpp:1: the global told has to be static"),
     ("globals", "diag/log.cpp", "        ++told;",
      "        for (static int inner = 0; inner < 3; ++inner)\n            ++told;",
-     r"diag/log\.cpp:1: the global tell\(char const\*\)::inner is not in"),
+     r"diag/log\.cpp:1: the global tell::inner is not in"),
     ("globals", "launcher/main.cpp", "int main", "bool late[4];\nint main",
      r"launcher/main\.cpp:1: the global late is not in"),
     ("globals", "launcher/startup.cpp", "void startup", "extern const int limits[];\n"
@@ -362,11 +362,12 @@ def check_executables():
     # The narrow calls only exist in 32 bits, where a compiler for them is installed.
     os.makedirs("i686", exist_ok=True)
     write("narrow.cpp", '#include <cstdio>\nint main() { return fopen("x", "r") != nullptr; }\n')
-    narrow = subprocess.run(["g++", "-m32", *GOOD_FLAGS, "narrow.cpp", "-o", "i686/program", *GOOD_LINK],
-                            capture_output=True, check=False)
-    if narrow.returncode == 0:
+    narrow = ["g++", "-m32", *GOOD_FLAGS, "narrow.cpp"]
+    if subprocess.run([*narrow, "-c", "-o", "i686/narrow.o"], capture_output=True, check=False).returncode == 0:
+        subprocess.run([*narrow, "-o", "i686/program", *GOOD_LINK], check=True)
+        subprocess.run(["ar", "rc", "i686/libnarrow.a", "i686/narrow.o"], check=True)
         status, output = lint("hardening", "i686/program")
-        if status != 1 or "i686/program:1: fopen: the form without" not in output:
+        if status != 1 or "i686/program:1: narrow.o: fopen: the form without" not in output:
             failures.append(f"hardening: fopen in 32 bits: status {status}:\n{output}")
 
 
