@@ -39,7 +39,7 @@ int main(int argc, char** argv)
     const char* jvm = NULL;
     const char* archive = NULL;
     int jvm_words = argc;
-    /* At most every word of ours comes back, with "-cp", the archive, the main class and the end. */
+    /* At most our own words come back, with "-cp", the archive, the main class and the end. */
     struct words platform = {calloc((size_t)argc + 1, sizeof(char*)), 0};
     struct words command = {calloc((size_t)argc + 6, sizeof(char*)), 0};
     if (platform.list == NULL || command.list == NULL)

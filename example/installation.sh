@@ -31,7 +31,7 @@ example_jdk() {
     printf '%s\n' "${compiler%/bin/javac}"
 }
 
-# Where the files of one bundle or archive lie; "NAME.jar" is what the packages' own links are called.
+# Where a bundle or archive lies. The packages have a link without a version to each.
 example_bundle_path() {
     local bundle=$EXAMPLE_JARS/$1.jar
     [[ -r $bundle ]] || {

@@ -107,7 +107,8 @@ public final class PlatformApplication implements IApplication {
         }
         // The word alone: with a line end it would be another word.
         Files.writeString(given.home().resolve(".exitData"), "logoff");
-        Report.say("Run " + run + ": it asks for the end of the session (\"logoff\" in ~/.exitData).");
+        Report.say("Run " + run
+                + ": it asks for the end of the session (\"logoff\" in ~/.exitData).");
     }
 
     private static void stayUntil(Path leave) throws InterruptedException {

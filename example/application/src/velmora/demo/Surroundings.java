@@ -50,7 +50,7 @@ final class Surroundings {
         return Path.of(System.getProperty("rcp.home"));
     }
 
-    /** The home directory as velmora sees it; the JVM's own user.home comes from the user database. */
+    /** The home directory as velmora sees it; the JVM's user.home comes from the user database. */
     Path home() {
         return Path.of(System.getenv("HOME"));
     }
