@@ -19,6 +19,7 @@ static const size_t LONGEST_TRACE = 999;
 static bool debug = false;
 static std::string logque;
 static FILE* logFILE = nullptr;
+static bool bLineBlock = false;
 static std::wstring debugFilePath;
 static bool bDebugFileExists = false;
 
@@ -60,9 +61,23 @@ static void writeLine(const char* line)
         addcstr_to_logque(line);
         return;
     }
-    fflush(logFILE);
+    if (!bLineBlock)
+        fflush(logFILE);
     fputs(line, logFILE);
-    fflush(logFILE);
+    if (!bLineBlock)
+        fflush(logFILE);
+}
+
+LineBlock::LineBlock()
+{
+    bLineBlock = true;
+}
+
+LineBlock::~LineBlock()
+{
+    bLineBlock = false;
+    if (logFILE != nullptr)
+        fflush(logFILE);
 }
 
 // Decision: a line that is too long is cut to 4095 bytes and gets its line end after them.

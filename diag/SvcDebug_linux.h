@@ -49,6 +49,16 @@ private:
     bool previous = false;
 };
 
+/// While one of these lives, the lines that are written belong together: they reach the file when
+/// it ends. For the parameters of a launch, which are many short lines. The process must neither
+/// fork nor end meanwhile.
+struct LineBlock {
+    LineBlock();
+    ~LineBlock();
+    LineBlock(const LineBlock&) = delete;
+    LineBlock& operator=(const LineBlock&) = delete;
+};
+
 // ---- Trace lines: nothing happens while tracing is off -----------------------------------------
 
 /// Writes one line in the manner of printf.

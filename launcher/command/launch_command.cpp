@@ -34,6 +34,7 @@ char** newExecArguments(const std::vector<std::wstring>& args, const char* begin
     char** words = new char*[args.size() + 1];
     size_t count = 0;
     const ForcedTrace forced;
+    const LineBlock together;
     SvcDebugOutA(begin);
     for (const std::wstring& arg : args) {
         std::string bytes;

@@ -5,6 +5,7 @@
 #include <cerrno>
 #include <csignal>
 #include <fcntl.h>
+#include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -54,10 +55,25 @@ static ChildStart executeInChild(char** args)
     return {IN_FAILED_CHILD, 0, result};
 }
 
+// Without a copy of this process, which would cost more than half of all the rest. The call comes
+// back once the child is the new program; it gives no child when that cannot be.
+static pid_t spawnChild(char** args)
+{
+    pid_t child = 0;
+    if (args[0] == nullptr || posix_spawn(&child, args[0], nullptr, nullptr, args, environ) != 0)
+        return -1;
+    return child;
+}
+
 // Decision: the parent goes on only after the exec. Until then ps shows the child as a launcher,
 // and one that reads its number from the lock file would take it for a stranger.
 ChildStart startChild(char** args)
 {
+    const pid_t spawned = spawnChild(args);
+    if (spawned > 0)
+        return {CHILD_STARTED, static_cast<int>(spawned), 0};
+    // What the child does that cannot become the platform is a launcher's work, so it must be a
+    // whole process; and where no process can be had, this shows it.
     ExecPipe execPipe;
     const pid_t child = fork();
     if (child == 0)

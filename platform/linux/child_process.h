@@ -1,4 +1,4 @@
-// Starting the platform as a child: fork and execv, and the moment in which the child becomes it.
+// Starting the platform as a child, and the moment in which the child becomes it.
 #ifndef PLATFORM_LINUX_CHILD_PROCESS_H
 #define PLATFORM_LINUX_CHILD_PROCESS_H
 
@@ -14,7 +14,7 @@ struct ChildStart {
     int execResult; // of execv, in the child; 0 otherwise
 };
 
-/// Forks and executes args[0] with `args`, which ends with a null. The parent returns only once
+/// Starts a child that executes args[0] with `args`, which ends with a null. The parent returns only once
 /// the child has become the new program or has failed to. Error lines, always written: the child
 /// that cannot be executed writes "Unable to execute <path> : <reason>", a launcher that cannot
 /// fork writes "Unable to start <path> : <reason>".

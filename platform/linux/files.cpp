@@ -197,18 +197,28 @@ void open_prop_file(FILE*& fp, const char* path, const char* mode)
     fp = fopen(path, (std::string(mode) + 'e').c_str());
 }
 
+// The bytes of `format`. Reading a file asks for the same one over and over.
+static const char* narrowFormat(const wchar_t* format)
+{
+    static std::wstring last;
+    static std::string bytes;
+    if (last != format) {
+        last = format;
+        wcstochar(bytes, format);
+    }
+    return bytes.c_str();
+}
+
 int readFile(FILE* fp, const wchar_t* format, wchar_t* out)
 {
     // Never cleared as a whole: that would cost more than all the rest of a start.
     static char work[819200];
     work[0] = '\0';
-    std::string narrowFormat;
-    wcstochar(narrowFormat, format);
-    const int result = fscanf(fp, narrowFormat.c_str(), work);
-    // Decision: a read that matched nothing hands over an empty line.
-    wchar_t* text = chartowcs(work);
-    wcscpy(out, text);
-    freeString(text);
+    const int result = fscanf(fp, narrowFormat(format), work);
+    // Decision: a read that matched nothing hands over an empty line, and so do bytes that the
+    // locale cannot convert.
+    if (mbstowcs(out, work, LINE_ROOM) >= LINE_ROOM)
+        out[0] = L'\0';
     return result;
 }
 

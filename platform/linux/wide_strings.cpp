@@ -2,6 +2,7 @@
 
 #include "diag/SvcDebug_linux.h"
 
+#include <climits>
 #include <cstdlib>
 #include <cwchar>
 
@@ -45,25 +46,48 @@ wchar_t* initMemString(wchar_t* dst, const wchar_t* src)
     return wcscat(dst, src);
 }
 
-// What the counting call reports, plus one; 0 for bytes that the locale cannot convert.
-static size_t wideLength(const char* s)
+// What the locale makes of `s`: in `near` when it fits there, so that most texts are converted just
+// once. Returns the number of characters, 0 also for bytes that the locale cannot convert.
+static const size_t NEAR = 512;
+
+static size_t convertNear(const char* s, wchar_t (&near)[NEAR], bool& fits)
 {
-    return mbstowcs(nullptr, s, 0) + 1;
+    size_t length = mbstowcs(near, s, NEAR);
+    fits = length < NEAR;
+    if (length == NEAR)
+        length = mbstowcs(nullptr, s, 0);
+    if (length != static_cast<size_t>(-1))
+        return length;
+    fits = true;
+    near[0] = L'\0';
+    return 0;
+}
+
+// Fills `block`, which has room for `length` characters and the terminating zero.
+static wchar_t* fillWide(wchar_t* block, const char* s, const wchar_t (&near)[NEAR], bool fits,
+                         size_t length)
+{
+    if (fits)
+        wmemcpy(block, near, length + 1);
+    else
+        mbstowcs(block, s, length + 1);
+    return block;
 }
 
 wchar_t* chartowcs(const char* s)
 {
-    const size_t length = wideLength(s);
-    wchar_t* block = newString(length);
-    mbstowcs(block, s, length);
-    return block;
+    wchar_t near[NEAR];
+    bool fits = false;
+    const size_t length = convertNear(s, near, fits);
+    return fillWide(newString(length), s, near, fits, length);
 }
 
 const wchar_t* chartowstr(const char* s, std::wstring& out)
 {
-    const size_t length = wideLength(s);
-    wchar_t* block = mallocString(length);
-    mbstowcs(block, s, length);
+    wchar_t near[NEAR];
+    bool fits = false;
+    const size_t length = convertNear(s, near, fits);
+    wchar_t* block = fillWide(mallocString(length), s, near, fits, length);
     out = block;
     freeString(block);
     return out.c_str();
@@ -73,6 +97,13 @@ const wchar_t* chartowstr(const char* s, std::wstring& out)
 static int convert(std::string& out, const wchar_t* s)
 {
     out.clear();
+    char near[NEAR];
+    size_t count = wcstombs(near, s, NEAR);
+    // With less room left than a character may need, the text may have been cut before one.
+    if (count < NEAR - MB_LEN_MAX) {
+        out.assign(near, count);
+        return static_cast<int>(count);
+    }
     const size_t length = wcstombs(nullptr, s, 0) + 1;
     if (length == 0)
         return -1;
@@ -82,7 +113,7 @@ static int convert(std::string& out, const wchar_t* s)
         fatalErrorA("QVMRL0004E: malloc failed!", EXIT_PROCESS, WITH_ERRNO);
         return -1;
     }
-    const size_t count = wcstombs(buffer, s, length);
+    count = wcstombs(buffer, s, length);
     out.assign(buffer, length - 1);
     free(buffer);
     return static_cast<int>(count);
