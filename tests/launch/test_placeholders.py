@@ -32,7 +32,6 @@ def test_keys_are_not_touched(world):
 @pytest.mark.parametrize("value, result", [
     ("x${prop.b}y", "x12y"),
     ("${prop.a}${prop.b}", "112"),
-    ("${prop.home}", "/mnt/app/x"),
     ("${env.NOSUCH,dflt}", "dflt"),
     ("${env.NOSUCH,}", ""),
     ("${env.NOSUCH,a,b}", "a,b"),
@@ -47,7 +46,7 @@ def test_keys_are_not_touched(world):
 ])
 def test_values(world, value, result):
     """What a value brings in is resolved again. A default is taken when the variable is unset, not when it is empty."""
-    properties = ["a=1", "b=${prop.a}2", "home=${rcp.home}/x", "empty="]
+    properties = ["a=1", "b=${prop.a}2", "empty="]
     env = {"SOME": "thing", "EMPTY": "", "NESTED": "${prop.a}"}
     assert shown(world, "-Dx=" + value, *properties, env=env) == ["-Dx=" + result]
 
@@ -56,6 +55,16 @@ def test_a_later_value_sees_the_earlier_ones_resolved(world):
     """So a chain that is written from its end has no limit."""
     chain = ["p30=end"] + ["p%d=${prop.p%d}" % (number, number + 1) for number in range(29, 0, -1)]
     assert shown(world, *chain, "-Dx=${prop.p1}") == ["-Dx=end"]
+
+
+def test_a_standard_one_in_another_property(world):
+    """Its own value has it resolved, so it must stand before the one that asks for it."""
+    assert shown(world, "home=${rcp.home}/x", "-Dx=${prop.home}") == ["-Dx=/mnt/app/x"]
+
+
+def test_a_standard_one_in_a_later_property(world):
+    """It is brought in unresolved, where only the other kinds are looked for."""
+    refused(world, "${rcp.home}/x", "-Dx=${prop.home}", "home=${rcp.home}/x")
 
 
 @pytest.mark.parametrize("value, text", [

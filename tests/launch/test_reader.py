@@ -181,6 +181,7 @@ def test_more_pairs_than_the_first_block_of_a_search(world):
         words = ["-Dp%d=%d" % (number, number) for number in range(count)]
         world.jvm_properties(*words)
         world.run()
+        world.all_ended()
         argv = world.platforms()[-1].argv
         assert argv == HEAD + areas() + STARTUP + system() + words + INSTALL_AREA
 

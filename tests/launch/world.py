@@ -8,6 +8,7 @@ import contextlib
 import os
 import pathlib
 import re
+import signal
 import stat
 import subprocess
 import time
@@ -102,12 +103,12 @@ class Platform:
         self.descriptors = {int(number): target for number, target in self.descriptors.items()}
 
     def alive(self):
-        return _state(self.pid) not in (None, "Z", "X")
+        return state(self.pid) not in (None, "Z", "X")
 
     def end(self):
         """Lets it go on with its plan after "sleep" or "wait", and waits until it is gone."""
-        os.kill(self.pid, 15)
-        until(lambda: _state(self.pid) in (None, "Z"), "the platform has ended")
+        os.kill(self.pid, signal.SIGTERM)
+        until(lambda: state(self.pid) in (None, "Z"), "the platform has ended")
 
 
 class Start:
@@ -120,6 +121,10 @@ class Start:
         self._process, self._out, self._err = process, out, err
         self._began = time.monotonic()
 
+    def age(self):
+        """Seconds since it was started."""
+        return time.monotonic() - self._began
+
     def running(self):
         return self._process.poll() is None
 
@@ -129,7 +134,7 @@ class Start:
             self.status = self._process.wait(within)
         except subprocess.TimeoutExpired:
             raise AssertionError("the launcher is still running after %s seconds" % within) from None
-        self.seconds = time.monotonic() - self._began
+        self.seconds = self.age()
         said = tuple(os.pread(fd, 1 << 20, 0).decode("utf-8", "replace") for fd in (self._out, self._err))
         assert said == ("", ""), "standard output and standard error: %r, %s" % said
         return self
@@ -208,7 +213,7 @@ class World:
         """A live process of that program, such as another platform; a stand-in neither records nor ends."""
         process = subprocess.Popen([program, *words], env={"STAND_IN_HOLDS": "1"}, stdin=subprocess.DEVNULL)
         self._holders.append(process)
-        until(lambda: _executable(process.pid) != _executable(os.getpid()), "the holder runs its program")
+        until(lambda: executable(process.pid) != executable(os.getpid()), "the holder runs its program")
         return process
 
     def end(self, holder):
@@ -250,9 +255,10 @@ class World:
         return {name: value for name, value in known.items() if value is not None}
 
     def start(self, *words, program=LAUNCHER, argv0=None, env=None, uid=None, cwd="/mnt", umask=0o022, closed=(),
-              strace=None):
-        """Starts the launcher and returns at once. `closed` are descriptors that are closed; `strace` are words for
-        strace, such as "-e", "inject=clone:error=EAGAIN"; the tracer goes away by itself."""
+              ignored=(), strace=None):
+        """Starts the launcher and returns at once. `closed` are descriptors that are closed, `ignored` signals that are
+        ignored; `strace` are words for strace, such as "-e", "inject=clone:error=EAGAIN"; the tracer goes away by
+        itself."""
         given = self.environment(env)
         for name in FOR_THE_BUILD:
             if name in os.environ:
@@ -265,13 +271,20 @@ class World:
             # The leak check traces its own process, which a traced process cannot.
             given["ASAN_OPTIONS"] = ":".join(filter(None, [given.get("ASAN_OPTIONS"), "detect_leaks=0"]))
             program, command = "/usr/bin/strace", ["strace", "-D", "-f", "-o", "/dev/shm/strace", *strace, *command]
+
+        def just_before():
+            for number in closed:
+                os.close(number)
+            for number in ignored:
+                signal.signal(number, signal.SIG_IGN)
+
         out, err = (os.memfd_create(name) for name in ("out", "err"))
         uid = self.uid if uid is None else uid
         with self.privileged() if uid != self.uid else contextlib.nullcontext():
             process = subprocess.Popen(
                 command, executable=program, env=given, cwd=cwd, umask=umask, stdin=subprocess.DEVNULL, stdout=out,
                 stderr=err, user=uid, group=uid, extra_groups=[] if uid != self.uid else None,
-                preexec_fn=(lambda: [os.close(number) for number in closed]) if closed else None)
+                preexec_fn=just_before)
         start = Start(process, out, err)
         self._starts.append(start)
         return start
@@ -295,6 +308,10 @@ class World:
         until(record.exists, "platform number %d has started" % number, within)
         return Platform(record.read_bytes())
 
+    def all_ended(self):
+        """Waits until everything that was started is gone, so that the next start finds no living platform."""
+        until(lambda: not self.strangers(), "every started process has ended")
+
     def only_platform(self):
         platforms = self.platforms()
         assert len(platforms) == 1, [platform.argv for platform in platforms]
@@ -313,7 +330,7 @@ class World:
     def _settled(self):
         recorded = {platform.pid for platform in self._records()}
         return not [pid for pid in self.strangers() if pid not in recorded
-                    and _state(pid) not in (None, "Z", "X") and not _executable(pid).endswith("/strace")]
+                    and state(pid) not in (None, "Z", "X") and not executable(pid).endswith("/strace")]
 
     def fatal(self, start, message, reason=None):
         """The start ended with status 255 and nothing was started; the last line of its log is the message and, after
@@ -366,7 +383,8 @@ def tree(top):
     return [line for _, line in sorted(found)]
 
 
-def _state(pid):
+def state(pid):
+    """The letter of the process's state, or None when there is no such process."""
     try:
         with open("/proc/%d/stat" % pid) as file:
             return file.read().rsplit(")", 1)[1].split()[0]
@@ -374,7 +392,8 @@ def _state(pid):
         return None
 
 
-def _executable(pid):
+def executable(pid):
+    """The program that the process runs."""
     try:
         return os.readlink("/proc/%d/exe" % pid)
     except OSError:
