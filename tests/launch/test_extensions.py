@@ -4,7 +4,8 @@ import pytest
 
 from world import CONFIG, HEAD, INSTALL_AREA, LAUNCHER, STARTUP, WORKSPACE, areas, lines, read, system
 
-OPTIONS_WITH_A_VALUE = ["-vm", "-data", "-plugincustomization", "-application", "-product", "-personality", "-nl", "-dir"]
+OPTIONS_WITH_A_VALUE = ["-vm", "-data", "-plugincustomization", "-application", "-product", "-personality", "-nl",
+                        "-dir"]
 
 
 def extension(*words, name="a"):
