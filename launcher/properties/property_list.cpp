@@ -35,8 +35,8 @@ wchar_t* findProperty(const wchar_t* key, const PropertyList& list)
     return nullptr;
 }
 
-// Room for `count` pointers and the terminator. Decision: a failure to grow ends the process with
-// the same line as a failure to begin.
+// Room for `count` pointers and the terminator.
+// Decision: a failure to grow ends the process with the same line as a failure to begin.
 static wchar_t** resizeFound(wchar_t** found, size_t count)
 {
     auto** room =
