@@ -1,0 +1,213 @@
+#include "platform/linux/wide_strings.h"
+
+#include "tests/unit/separate_process.h"
+#include "tests/unit/support.h"
+
+#include <cerrno>
+#include <clocale>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <cwchar>
+
+// So many characters that no allocator has room for them.
+static const size_t TOO_MANY = SIZE_MAX / sizeof(wchar_t) - 3;
+
+// Half of a pair: in no encoding a character of its own.
+static const wchar_t NO_CHARACTER = 0xd800;
+
+static const size_t MEGABYTE = 1024 * 1024;
+
+// The sanitizer ends the process at an allocation that is too large, unless it is told otherwise.
+static bool allocationsMayFail()
+{
+    const char* options = getenv("ASAN_OPTIONS");
+    return !underAddressSanitizer() ||
+           (options != nullptr && strstr(options, "allocator_may_return_null=1") != nullptr);
+}
+
+TEST(newString, GivesAnEmptyString)
+{
+    wchar_t* text = newString(0);
+    EXPECT_STREQ(text, L"");
+    freeString(text);
+}
+
+TEST(newString, HasRoomForItsCharactersAndTheZero)
+{
+    wchar_t* text = newString(3);
+    EXPECT_STREQ(text, L"");
+    wcscpy(text, L"abc");
+    EXPECT_STREQ(text, L"abc");
+    freeString(text);
+}
+
+TEST(newString, EndsTheProcessWithoutMemory)
+{
+    if (!allocationsMayFail())
+        GTEST_SKIP() << "needs allocator_may_return_null=1 in ASAN_OPTIONS";
+    EXPECT_TRUE(endsWith([] { newString(TOO_MANY); },
+                         "QVMRL0004E: newString malloc failed.  Failed with error 12: "
+                         "Cannot allocate memory"));
+}
+
+TEST(mallocString, GivesAnEmptyString)
+{
+    wchar_t* none = mallocString(0);
+    EXPECT_STREQ(none, L"");
+    freeString(none);
+    wchar_t* text = mallocString(3);
+    EXPECT_STREQ(text, L"");
+    wcscpy(text, L"abc");
+    EXPECT_STREQ(text, L"abc");
+    freeString(text);
+}
+
+TEST(mallocString, EndsTheProcessWithoutMemory)
+{
+    if (!allocationsMayFail())
+        GTEST_SKIP() << "needs allocator_may_return_null=1 in ASAN_OPTIONS";
+    EXPECT_TRUE(endsWith([] { mallocString(TOO_MANY); }, "QVMRL0004E: mallocString malloc failed!",
+                         ENOMEM));
+}
+
+TEST(freeString, GivesNull)
+{
+    EXPECT_EQ(freeString(newString(5)), nullptr);
+    EXPECT_EQ(freeString(nullptr), nullptr);
+}
+
+TEST(initMemString, CopiesToAFreshString)
+{
+    wchar_t* text = newString(3);
+    EXPECT_EQ(initMemString(text, L"abc"), text);
+    EXPECT_STREQ(text, L"abc");
+    freeString(text);
+}
+
+TEST(initMemString, DeliberatelyAppends)
+{
+    wchar_t* text = newString(5);
+    initMemString(text, L"ab");
+    EXPECT_EQ(initMemString(text, L"cde"), text);
+    EXPECT_STREQ(text, L"abcde");
+    freeString(text);
+}
+
+TEST(chartowcs, ConvertsTheLocalesBytes)
+{
+    wchar_t* text = chartowcs("a\xc3\xa9\xe2\x82\xac\xf0\x9f\x98\x80z");
+    EXPECT_STREQ(text, L"a\u00e9\u20ac\U0001f600z");
+    freeString(text);
+    wchar_t* empty = chartowcs("");
+    EXPECT_STREQ(empty, L"");
+    freeString(empty);
+}
+
+TEST(chartowcs, GivesABlockOfItsOwn)
+{
+    char source[] = "abc";
+    wchar_t* text = chartowcs(source);
+    source[0] = 'x';
+    EXPECT_STREQ(text, L"abc");
+    freeString(text);
+}
+
+TEST(chartowcs, MakesTheWholeResultEmptyForBytesThatCannotBeConverted)
+{
+    for (const char* bytes : {"good\xff", "\xc3", "\xed\xa0\x80"}) {
+        wchar_t* text = chartowcs(bytes);
+        EXPECT_STREQ(text, L"");
+        freeString(text);
+    }
+}
+
+TEST(chartowstr, ConvertsAndReturnsTheCharacters)
+{
+    std::wstring out = L"before";
+    const wchar_t* characters = chartowstr("\xc3\xa9t\xc3\xa9", out);
+    EXPECT_EQ(out, L"\u00e9t\u00e9");
+    EXPECT_EQ(characters, out.c_str());
+    chartowstr("", out);
+    EXPECT_EQ(out, L"");
+}
+
+TEST(chartowstr, MakesTheWholeResultEmptyForBytesThatCannotBeConverted)
+{
+    std::wstring out = L"before";
+    chartowstr("good\xff", out);
+    EXPECT_EQ(out, L"");
+}
+
+TEST(wcstochar, ConvertsToTheLocalesBytes)
+{
+    std::string out = "before";
+    wcstochar(out, L"a\u00e9\u20ac\U0001f600z");
+    EXPECT_EQ(out, "a\xc3\xa9\xe2\x82\xac\xf0\x9f\x98\x80z");
+    wcstochar(out, L"");
+    EXPECT_EQ(out, "");
+}
+
+TEST(wcstochar, TakesALongTextOfFourBytesACharacter)
+{
+    std::string expected;
+    for (int i = 0; i < 3000; ++i)
+        expected += "\xf0\x9f\x98\x80";
+    std::string out;
+    wcstochar(out, std::wstring(3000, L'\U0001f600').c_str());
+    EXPECT_EQ(out, expected);
+}
+
+TEST(wcstochar, DecisionTextThatCannotBeConvertedBecomesEmpty)
+{
+    std::string out = "before";
+    wcstochar(out, (std::wstring(L"good") + NO_CHARACTER).c_str());
+    EXPECT_EQ(out, "");
+    ASSERT_STREQ(setlocale(LC_CTYPE, "C"), "C");
+    out = "before";
+    wcstochar(out, L"a\u20ac");
+    setlocale(LC_CTYPE, "C.UTF-8");
+    EXPECT_EQ(out, "");
+}
+
+// 4 million characters are counted as 4 million bytes and one: 16 megabytes and 4 bytes.
+static std::string convertedWithin(size_t megabytes)
+{
+    const std::wstring text(4 * MEGABYTE, L'a');
+    std::string out;
+    boundMemory(megabytes * MEGABYTE);
+    wcstochar(out, text.c_str());
+    return out;
+}
+
+TEST(wcstochar, DeliberatelyTakesFourTimesTheCountedLength)
+{
+    if (underAddressSanitizer())
+        GTEST_SKIP() << "the address sanitizer's memory cannot be bounded";
+    EXPECT_TRUE(endsWith([] { convertedWithin(15); }, "QVMRL0004E: malloc failed!", ENOMEM));
+    EXPECT_TRUE(
+        holdsInChild([] { EXPECT_EQ(convertedWithin(24), std::string(4 * MEGABYTE, 'a')); }));
+}
+
+TEST(wstrtocs, ReturnsTheNumberOfBytes)
+{
+    std::string out = "before";
+    EXPECT_EQ(wstrtocs(out, L"a\u00e9\u20ac"), 6);
+    EXPECT_EQ(out, "a\xc3\xa9\xe2\x82\xac");
+    EXPECT_EQ(wstrtocs(out, L""), 0);
+    EXPECT_EQ(out, "");
+}
+
+TEST(wstrtocs, EndsAtAZero)
+{
+    std::string out;
+    EXPECT_EQ(wstrtocs(out, std::wstring(L"ab\0cd", 5)), 2);
+    EXPECT_EQ(out, "ab");
+}
+
+TEST(wstrtocs, DecisionTextThatCannotBeConvertedBecomesEmpty)
+{
+    std::string out = "before";
+    EXPECT_EQ(wstrtocs(out, std::wstring(L"good") + NO_CHARACTER), -1);
+    EXPECT_EQ(out, "");
+}
