@@ -37,13 +37,18 @@ static std::string narrow(const wchar_t* text)
     return out;
 }
 
-static std::string narrowPath(std::wstring path)
+static std::wstring withSlashes(std::wstring path)
 {
     for (wchar_t& c : path) {
         if (c == L'\\')
             c = L'/';
     }
-    return narrow(path.c_str());
+    return path;
+}
+
+static std::string narrowPath(const std::wstring& path)
+{
+    return narrow(withSlashes(path).c_str());
 }
 
 static bool fileExists(const char* path)
@@ -287,8 +292,8 @@ static std::wstring logFileName(const std::wstring& dir)
 
 bool enableLogging(const std::wstring& dir)
 {
-    const std::wstring name = logFileName(dir);
-    const std::string path = narrowPath(name);
+    const std::wstring name = withSlashes(logFileName(dir));
+    const std::string path = narrow(name.c_str());
     logFILE = fopen(path.c_str(), "w+e");
     if (logFILE == nullptr) {
         fatalErrorA("QVMRL0019E: Could not open %ls for writing!", name.c_str(), GO_ON, WITH_ERRNO);
@@ -314,11 +319,7 @@ void deleteTempLog()
 
 void getLogLocation(std::wstring& out, const std::wstring& base)
 {
-    out = base + L"/logs";
-    for (wchar_t& c : out) {
-        if (c == L'\\')
-            c = L'/';
-    }
+    out = withSlashes(base + L"/logs");
 }
 
 bool debugFileExists(const std::wstring& dir)

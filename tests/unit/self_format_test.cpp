@@ -34,3 +34,32 @@ TEST(formatOfItself, PassesBytesOnOneByOne)
     EXPECT_EQ(formatOfItself(std::string("\xc3\xa9%s\xff%%")), "\xc3\xa9\xff%");
     EXPECT_EQ(formatOfItself(std::string("\xc3\xa9")), "\xc3\xa9");
 }
+
+TEST(formatOfItself, DecisionAnIncompleteConversionLosesNothingAndTheWalkGoesOnBehindItsSign)
+{
+    EXPECT_EQ(formatOfItself(std::wstring(L"%5%d|")), L"%5|");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%-%s%n|")), L"%-|");
+    EXPECT_EQ(formatOfItself(std::wstring(L"% %%d")), L"% %d");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%.%%")), L"%.%");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%l%")), L"%l%");
+}
+
+TEST(formatOfItself, TwoSignsAreTakenFromTheLeft)
+{
+    EXPECT_EQ(formatOfItself(std::wstring(L"%%%")), L"%%");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%%%d|")), L"%|");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%%%%%s")), L"%%");
+}
+
+TEST(formatOfItself, KnowsTheLengthsAndNoOthers)
+{
+    EXPECT_EQ(formatOfItself(std::wstring(L"<%hhd%lld%ld%'d>")), L"<>");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%hld %LLd %lx")), L"%hld %LLd ");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%1$d %Id %k")), L"%1$d %Id %k");
+}
+
+TEST(formatOfItself, TakesAZeroAsAnyOtherCharacter)
+{
+    EXPECT_EQ(formatOfItself(std::wstring(L"a%\0d", 4)), std::wstring(L"a%\0d", 4));
+    EXPECT_EQ(formatOfItself(std::wstring(L"a\0%d", 4)), std::wstring(L"a\0", 2));
+}
