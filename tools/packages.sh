@@ -25,7 +25,8 @@ package_group() {
         coverage) echo "gcovr" ;;
         valgrind) echo "valgrind" ;;
         fuzz) echo "clang llvm" ;;
-        packaging) echo "dpkg-dev file lintian" ;;
+        pages) echo "python3 python3-pytest mandoc man-db desktop-file-utils appstream" ;;
+        packaging) echo "dpkg-dev binutils file lintian debootstrap" ;;
         *)
             echo "packages.sh: there is no package group \"$1\"" >&2
             return 1
