@@ -14,8 +14,10 @@ public final class ReadBack {
             properties.load(in);
         }
         StringBuilder out = new StringBuilder();
-        for (Object key : new TreeMap<>(properties).keySet())
-            out.append(digits((String) key)).append('\t').append(digits(properties.getProperty((String) key))).append('\n');
+        for (Object key : new TreeMap<>(properties).keySet()) {
+            String value = properties.getProperty((String) key);
+            out.append(digits((String) key)).append('\t').append(digits(value)).append('\n');
+        }
         System.out.print(out);
     }
 
