@@ -224,7 +224,8 @@ def levels(world, user, launcher, *more):
     world.write(CLASSES + "/c", "x")
 
 
-@pytest.mark.parametrize("user, launcher", [("1", "2"), ("2", "1"), (None, "1"), (None, None), ("1", "1 2"), ("1", None)])
+@pytest.mark.parametrize("user, launcher", [
+    ("1", "2"), ("2", "1"), (None, "1"), (None, None), ("1", "1 2"), ("1", None)])
 def test_a_new_level_empties_the_shared_classes(world, user, launcher):
     """Also with a level that is missing on one side; the folder itself stays."""
     levels(world, user, launcher, PATH)
