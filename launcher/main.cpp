@@ -9,6 +9,7 @@
 #include "platform/linux/lock_file.h"
 #include "platform/linux/process.h"
 #include "platform/linux/session_end.h"
+#include "platform/linux/wide_strings.h"
 
 #include <clocale>
 #include <cstdio>
@@ -132,13 +133,13 @@ static void superviseLockdown(char** args)
 
 static void launchEclipse(int argc, wchar_t** argv)
 {
-    // Never released: the process ends, or becomes the platform.
     char** args = newExecArguments(launchArgs, "QVMRL0132I: ===== Begin Launch Parameters =====",
                                    "QVMRL0133I: ===== End Launch Parameters =====");
     if (isLockdownConfig() && !userIsAdmin(nullptr) && !bDaemon)
         superviseLockdown(args);
     else
         launchOnce(argc, argv, args);
+    freeExecArguments(args);
 }
 
 int main(int argc, char** argv)
@@ -156,5 +157,7 @@ int main(int argc, char** argv)
     doVersionCheck(argc, wargv);
     startup(argc, wargv, launchArgs);
     launchEclipse(argc, wargv);
+    for (wchar_t* word : words)
+        freeString(word);
     return 0;
 }

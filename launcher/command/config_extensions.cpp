@@ -97,10 +97,10 @@ static void mergeExtension(const std::wstring& name, const PropertyList& launche
             return;
         if (word[0] == L'\0')
             continue;
-        if (!point.haveVmargs || inJvmPart)
-            args.push_back(word);
-        else if (wcscmp(word, L"-vmargs") == 0)
+        if (point.haveVmargs && wcscmp(word, L"-vmargs") == 0)
             inJvmPart = true;
+        else if (!point.haveVmargs || inJvmPart)
+            args.push_back(word);
         else
             insertAt(args, point.position++, word);
     }

@@ -14,47 +14,63 @@ static void endInvalidSubstitution(const std::wstring& text)
                 WITH_ERRNO);
 }
 
-// True when no new placeholder can come to be where `value` meets the text around it.
-static bool meetsNothing(const std::wstring& value, const std::wstring& placeholder)
+// What values may bring in on top of what was asked for, in characters, before the replacing counts
+// as endless.
+static const unsigned long long MOST_BROUGHT_IN = 1ULL << 24;
+
+static bool hasAtEnd(const std::wstring& s, const std::wstring& end)
 {
-    return !value.empty() && value.find_first_of(L"$}") == std::wstring::npos &&
-           placeholder.find(value) == std::wstring::npos;
+    return s.size() >= end.size() && s.back() == end.back() &&
+           s.compare(s.size() - end.size(), end.size(), end) == 0;
 }
 
-static bool replaceEvery(const std::wstring& placeholder, const std::wstring& value,
-                         std::wstring& s)
+bool replaceEvery(const std::wstring& placeholder, const std::wstring& value, std::wstring& s)
 {
-    std::wstring::size_type found = s.find(placeholder);
-    if (found == std::wstring::npos)
-        return false;
-    // Decision: a value that holds its own placeholder would be put in for ever; it ends the start.
-    if (value.find(placeholder) != std::wstring::npos) {
-        endInvalidSubstitution(s);
-        return false;
-    }
-    if (meetsNothing(value, placeholder)) {
-        std::wstring out;
-        std::wstring::size_type at = 0;
-        for (; found != std::wstring::npos; found = s.find(placeholder, at)) {
-            out.append(s, at, found - at);
-            out += value;
-            at = found + placeholder.size();
-        }
-        s = out.append(s, at, std::wstring::npos);
+    if (s.find(placeholder) == std::wstring::npos)
         return true;
+    // Decision: a value that holds its own placeholder would be put in for ever, and so would some
+    // that complete one with what they meet. Values that only grow are replaced to the end.
+    if (value.find(placeholder) != std::wstring::npos)
+        return false;
+    unsigned long long left = MOST_BROUGHT_IN;
+    left += s.size() / placeholder.size() * (value.size() + 1ULL);
+    // The search that begins at the start again each time finds the placeholder that ends first,
+    // since none overlaps itself. `rest` is what has not been looked at, back to front.
+    const std::wstring backwards(value.rbegin(), value.rend());
+    std::wstring rest(s.rbegin(), s.rend());
+    s.clear();
+    while (!rest.empty()) {
+        s += rest.back();
+        rest.pop_back();
+        if (!hasAtEnd(s, placeholder))
+            continue;
+        if (left <= value.size()) {
+            s.append(rest.rbegin(), rest.rend());
+            return false;
+        }
+        left -= value.size() + 1;
+        s.resize(s.size() - placeholder.size());
+        rest += backwards;
     }
-    // Each search begins at the start again: the value may complete a placeholder there.
-    for (; found != std::wstring::npos; found = s.find(placeholder))
-        s.replace(found, placeholder.size(), value);
+    return true;
+}
+
+static bool replaceStandard(const std::wstring& placeholder, const std::wstring& value,
+                            std::wstring& s)
+{
+    if (s.find(placeholder) == std::wstring::npos)
+        return false;
+    if (!replaceEvery(placeholder, value, s))
+        endInvalidSubstitution(s);
     return true;
 }
 
 bool replaceStdPlaceholders(const std::wstring& workspace, const std::wstring& rcpHome,
                             std::wstring& s)
 {
-    const bool home = replaceEvery(L"${rcp.home}", rcpHome, s);
-    const bool location = replaceEvery(L"${workspace.location}", workspace, s);
-    const bool data = replaceEvery(L"${rcp.data}", workspace, s);
+    const bool home = replaceStandard(L"${rcp.home}", rcpHome, s);
+    const bool location = replaceStandard(L"${workspace.location}", workspace, s);
+    const bool data = replaceStandard(L"${rcp.data}", workspace, s);
     return home || location || data;
 }
 
@@ -138,6 +154,8 @@ bool replaceUserPlaceholders(std::wstring& s, const PropertyList& props)
 {
     Resolving work{s, {}};
     std::wstring::size_type lastStart = std::wstring::npos;
+    std::wstring::size_type lowestStart = std::wstring::npos;
+    unsigned long long left = MOST_BROUGHT_IN;
     bool ok = true;
     int repeats = 0;
     std::wstring::size_type length = 0;
@@ -163,6 +181,17 @@ bool replaceUserPlaceholders(std::wstring& s, const PropertyList& props)
             }
         } else {
             repeats = 0;
+        }
+        // Decision: a value that brings itself in beside another placeholder begins the count of
+        // repetitions again each time and would never end. A placeholder that stands no further
+        // left than the leftmost so far came in with a value; these have a limit of their own.
+        if (start < lowestStart) {
+            lowestStart = start;
+        } else if (left <= value.size()) {
+            ok = false;
+            break;
+        } else {
+            left -= value.size() + 1;
         }
         // Deliberate: from the first failure on, a value is not searched for placeholders again.
         if (!ok) {

@@ -16,6 +16,10 @@
 
 #include <string>
 
+/// Replaces every `placeholder`, which cannot overlap itself, in `s` by `value`, as if each search
+/// began at the start of `s`. False, with `s` as far as it came, when that would never end.
+bool replaceEvery(const std::wstring& placeholder, const std::wstring& value, std::wstring& s);
+
 /// Replaces the standard placeholders, in the order above. True when there was one.
 /// Fatal: QVMRL0088E for a value that contains the very placeholder that it replaces.
 bool replaceStdPlaceholders(const std::wstring& workspace, const std::wstring& rcpHome,
@@ -32,7 +36,8 @@ std::wstring::size_type findLastPlaceholder(const std::wstring& s, std::wstring:
 bool getPlaceholderValue(const std::wstring& name, std::wstring& value, const PropertyList& props);
 
 /// Resolves the user placeholders of `s` from its end to its start. False when one could not be
-/// resolved, or one brought itself in again ten times in a row; `s` then shows how far it came.
+/// resolved, one brought itself in again ten times in a row, or values brought in more and more
+/// without an end; `s` then shows how far it came.
 /// Traces QVMRL0071I for each.
 bool replaceUserPlaceholders(std::wstring& s, const PropertyList& props);
 

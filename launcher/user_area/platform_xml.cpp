@@ -1,6 +1,7 @@
 #include "launcher/user_area/platform_xml.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "launcher/properties/placeholders.h"
 #include "launcher/user_area/first_launch.h"
 #include "launcher/user_area/installation.h"
 #include "platform/linux/files.h"
@@ -28,18 +29,6 @@ static std::wstring placeholderOf(const wchar_t* key)
     return std::wstring(L"${") + key + L"}";
 }
 
-// Decision: a value that holds its own placeholder would be put in for ever; it counts as missing.
-static bool replaceEvery(std::wstring& line, const std::wstring& placeholder,
-                         const std::wstring& value)
-{
-    std::wstring::size_type found = line.find(placeholder);
-    if (found != std::wstring::npos && value.find(placeholder) != std::wstring::npos)
-        return false;
-    for (; found != std::wstring::npos; found = line.find(placeholder))
-        line.replace(found, placeholder.size(), value);
-    return true;
-}
-
 // Puts the feature into a line that names it. False when a value is missing.
 static bool fillIn(std::wstring& line, const Feature& feature, const PropertyList& props,
                    bool replaceFeatureLines)
@@ -53,9 +42,10 @@ static bool fillIn(std::wstring& line, const Feature& feature, const PropertyLis
     }
     const wchar_t* id = findProperty(feature.idKey, props);
     const wchar_t* version = findProperty(feature.versionKey, props);
+    // Decision: a value that holds its own placeholder would be put in for ever; it counts as missing.
     if (id != nullptr && version != nullptr &&
-        replaceEvery(line, placeholderOf(feature.idKey), id) &&
-        replaceEvery(line, placeholderOf(feature.versionKey), version))
+        replaceEvery(placeholderOf(feature.idKey), id, line) &&
+        replaceEvery(placeholderOf(feature.versionKey), version, line))
         return true;
     const ForcedTrace forced;
     SvcDebugOutA(feature.missing);
