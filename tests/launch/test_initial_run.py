@@ -56,7 +56,8 @@ def test_the_first_workspace_survives_with_its_value(world):
 
 def test_the_value_of_the_workspace_is_no_option(world):
     """Whatever it looks like, it is copied with the option and not looked at: a second such word survives."""
-    for folder in ("logs", ".config/org.eclipse.update", "applications/eclipse/features", "applications/eclipse/plugins"):
+    for folder in ("logs", ".config/org.eclipse.update", "applications/eclipse/features",
+                   "applications/eclipse/plugins"):
         world.folder("/mnt/-debug/" + folder)
     world.install("user", *GROUP)
     assert world.run("-data", "-debug", "-debug2", "-debug3", cwd="/mnt").status == 0
