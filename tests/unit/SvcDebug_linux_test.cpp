@@ -149,6 +149,36 @@ TEST(Output, DecisionALongerLineIsCutTo4095BytesAndEnds)
     EXPECT_EQ(logOf(true, [] { Output("%s\xc3\xa9", a(4094).c_str()); }), a(4094) + "\xc3\n");
 }
 
+TEST(LineBlock, BringsItsLinesIntoTheFileWhenItEnds)
+{
+    TempDir dir;
+    EXPECT_TRUE(holdsInChild([&] {
+        EXPECT_TRUE(enableLogging(dir.wdir));
+        {
+            const LineBlock block;
+            fatalErrorA("first", GO_ON, WITHOUT_ERRNO);
+            fatalErrorA("second", GO_ON, WITHOUT_ERRNO);
+            EXPECT_EQ(dir.read("velmora.log"), "\n");
+        }
+        EXPECT_EQ(dir.read("velmora.log"), "\nfirst\nsecond\n");
+        fatalErrorA("third", GO_ON, WITHOUT_ERRNO);
+        EXPECT_EQ(dir.read("velmora.log"), "\nfirst\nsecond\nthird\n");
+    }));
+}
+
+TEST(LineBlock, LeavesHeldLinesHeld)
+{
+    TempDir dir;
+    EXPECT_TRUE(holdsInChild([&] {
+        {
+            const LineBlock block;
+            fatalErrorA("first", GO_ON, WITHOUT_ERRNO);
+        }
+        EXPECT_TRUE(enableLogging(dir.wdir));
+        EXPECT_EQ(dir.read("velmora.log"), "first\n\n");
+    }));
+}
+
 TEST(SvcDebugOutA, WritesATextAsItStands)
 {
     EXPECT_EQ(logOf(true, [] { SvcDebugOutA("100% %s %n %d"); }), "100% %s %n %d\n");

@@ -67,7 +67,8 @@ TEST(getUserHome, IsTheValueOfHOME)
     std::wstring out;
     EXPECT_STREQ(getUserHome(out), L"/home/anna");
     EXPECT_EQ(out, L"/home/anna");
-    EXPECT_EQ(getUserHome(out), out.c_str());
+    const wchar_t* characters = getUserHome(out);
+    EXPECT_EQ(characters, out.c_str());
 }
 
 TEST(getUserHome, IsEmptyWithoutHOME)

@@ -189,6 +189,43 @@ TEST(wcstochar, DeliberatelyTakesFourTimesTheCountedLength)
         holdsInChild([] { EXPECT_EQ(convertedWithin(24), std::string(4 * MEGABYTE, 'a')); }));
 }
 
+// Texts on both sides of 512, beyond which a text does not fit into the converters' own memory, with
+// a character of four bytes, or one that cannot be converted, at the end.
+TEST(conversions, AreTheSameForTextsOfEveryLength)
+{
+    for (size_t length = 480; length < 530; ++length) {
+        const std::string bytes = std::string(length, 'a') + "\xf0\x9f\x98\x80";
+        const std::wstring text = std::wstring(length, L'a') + L'\U0001f600';
+        std::wstring wide = L"before";
+        chartowstr(bytes.c_str(), wide);
+        EXPECT_EQ(wide, text) << length;
+        wchar_t* block = chartowcs(bytes.c_str());
+        EXPECT_EQ(block, text) << length;
+        freeString(block);
+        std::string narrow = "before";
+        EXPECT_EQ(wstrtocs(narrow, text), static_cast<int>(length + 4));
+        EXPECT_EQ(narrow, bytes) << length;
+        wcstochar(narrow, text.c_str());
+        EXPECT_EQ(narrow, bytes) << length;
+    }
+}
+
+TEST(conversions, MakeTextsOfEveryLengthEmptyThatCannotBeConverted)
+{
+    for (size_t length = 480; length < 530; ++length) {
+        const std::string bytes = std::string(length, 'a') + "\xff";
+        std::wstring wide = L"before";
+        chartowstr(bytes.c_str(), wide);
+        EXPECT_EQ(wide, L"") << length;
+        wchar_t* block = chartowcs(bytes.c_str());
+        EXPECT_STREQ(block, L"") << length;
+        freeString(block);
+        std::string narrow = "before";
+        EXPECT_EQ(wstrtocs(narrow, std::wstring(length, L'a') + NO_CHARACTER), -1);
+        EXPECT_EQ(narrow, "") << length;
+    }
+}
+
 TEST(wstrtocs, ReturnsTheNumberOfBytes)
 {
     std::string out = "before";
