@@ -181,8 +181,7 @@ static void readUserProperties(StartupRun& run)
     std::wstring recorded = run.configuration + L"/args.properties";
     convertToOsSeparator(recorded);
     // Decision: a restart writes no record, and one after a reset finds none; it must still start.
-    if (exists(recorded.c_str()))
-        getProperties(recorded, run.userProps);
+    getPropertiesIfPresent(recorded, run.userProps);
 }
 
 static void setJavaHome(StartupRun& run, const std::wstring& jvmPropertiesPath, std::wstring vmPath)

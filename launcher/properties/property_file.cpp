@@ -91,18 +91,23 @@ static void takeLine(const std::wstring& line, PropertyParts& parts, PropertyLis
         finishProperty(parts, list);
 }
 
-void getProperties(const std::wstring& path, PropertyList& list)
+bool getPropertiesIfPresent(const std::wstring& path, PropertyList& list)
 {
     FILE* file = nullptr;
     open_file(file, path.c_str(), L"r");
-    if (file == nullptr) {
-        fatalErrorA("QVMRL0096E: Unable to load %ls file!", path.c_str(), EXIT_PROCESS, WITH_ERRNO);
-        return;
-    }
+    if (file == nullptr)
+        return false;
     PropertyParts parts;
     wchar_t line[LINE_ROOM];
     while (feof(file) == 0 && readFile(file, L" %2024[^\n]\n", line) != EOF)
         takeLine(line, parts, list);
     // A property that still continues at the end of the file is never finished.
     fclose(file);
+    return true;
+}
+
+void getProperties(const std::wstring& path, PropertyList& list)
+{
+    if (!getPropertiesIfPresent(path, list))
+        fatalErrorA("QVMRL0096E: Unable to load %ls file!", path.c_str(), EXIT_PROCESS, WITH_ERRNO);
 }

@@ -16,4 +16,7 @@
 /// ignored. Fatal: "QVMRL0096E: Unable to load %ls file!" with the reason; QVMRL0004E.
 void getProperties(const std::wstring& path, PropertyList& list);
 
+/// The same for a file that need not be there. False, and nothing read, when it cannot be opened.
+bool getPropertiesIfPresent(const std::wstring& path, PropertyList& list);
+
 #endif

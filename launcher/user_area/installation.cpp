@@ -88,10 +88,9 @@ bool isOldRcpInstallId(const std::wstring& installId, const std::wstring& config
 {
     std::wstring path = configDir + L"/rcpinstall.properties";
     convertToOsSeparator(path);
-    if (!exists(path.c_str()))
-        return false;
     PropertyList userProps;
-    getProperties(path, userProps);
+    if (!getPropertiesIfPresent(path, userProps))
+        return false;
     const wchar_t* id = findProperty(L"rcp.install.id", userProps);
     const bool old = id != nullptr && id[0] != L'\0' && installId != id;
     freeProperties(userProps);

@@ -170,6 +170,17 @@ bool copyNewFile(const wchar_t* from, const wchar_t* to)
     return publishNewFile(place, to);
 }
 
+// A buffer for a stream that is closed again by the function that opens it; at most two of these are
+// open at a time. Without one of its own a stream asks for the file's block size first, and one
+// for wide output writes sixteen bytes at a time.
+static void giveBuffer(FILE* fp)
+{
+    static char buffers[4][4096];
+    static unsigned next = 0;
+    setvbuf(fp, buffers[next], _IOFBF, sizeof buffers[next]);
+    next = (next + 1) % 4;
+}
+
 static void openStream(FILE*& fp, const wchar_t* path, const wchar_t* mode, int orientation)
 {
     std::string narrowPath;
@@ -178,8 +189,10 @@ static void openStream(FILE*& fp, const wchar_t* path, const wchar_t* mode, int 
     wcstochar(narrowMode, mode);
     narrowMode += 'e';
     fp = fopen(narrowPath.c_str(), narrowMode.c_str());
-    if (fp != nullptr)
-        fwide(fp, orientation);
+    if (fp == nullptr)
+        return;
+    giveBuffer(fp);
+    fwide(fp, orientation);
 }
 
 void open_file(FILE*& fp, const wchar_t* path, const wchar_t* mode)

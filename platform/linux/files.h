@@ -58,7 +58,8 @@ bool copyNewFile(const wchar_t* from, const wchar_t* to);
 
 // ---- Opening and reading -----------------------------------------------------------------------
 
-/// Opens a stream of bytes. `fp` is null on failure.
+/// Opens a stream of bytes. `fp` is null on failure. This stream and the next are closed again
+/// before more than four are open: they share a few buffers.
 void open_file(FILE*& fp, const wchar_t* path, const wchar_t* mode);
 
 /// Opens a stream for the C library's wide output. `fp` is null on failure.
