@@ -11,10 +11,12 @@
 #include "platform/linux/session_end.h"
 #include "platform/linux/wide_strings.h"
 
+#include <cerrno>
 #include <clocale>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <cwchar>
 #include <new>
 
 // Out of memory ends the process as loudly for `new` as for malloc. If even the line cannot be
@@ -25,7 +27,10 @@ static void endWithoutMemory()
     if (entered)
         _Exit(255);
     entered = true;
-    fatalErrorA("QVMRL0004E: newString malloc failed. %ls", L"", EXIT_PROCESS, WITH_ERRNO);
+    const int error = errno;
+    wchar_t reason[256] = L"";
+    swprintf(reason, 256, L" Failed with error %d: %s", error, strerror(error));
+    fatalErrorA("QVMRL0004E: newString malloc failed. %ls", reason, EXIT_PROCESS, WITHOUT_ERRNO);
 }
 
 static void logArguments(int argc, wchar_t** argv)
