@@ -274,7 +274,7 @@ def number_of(message):
 
 def roff(text):
     """Plain text for man."""
-    text = text.replace("\\", "\\e").replace("-", "\\-").replace("^", "\\(ha").replace("~", "\\(ti")
+    text = text.replace("\\", "\\e").replace("-", "\\-").replace("^", "\\(ha").replace("~", "\\(ti").replace('"', "\\(dq")
     return re.sub(r"^([.'])", r"\\&\1", text, flags=re.M)
 
 
@@ -282,7 +282,7 @@ def sentences(text):
     """Each sentence on a line of its own, as man wants it; long ones are filled."""
     out = []
     for piece in re.split(r"(?<=[.;:!?)])\s+(?=[A-Z(\"])", text.strip()):
-        out += [roff(line) for line in textwrap.wrap(piece, 78, break_on_hyphens=False, break_long_words=False)]
+        out += [roff(line) for line in textwrap.wrap(piece, 66, break_on_hyphens=False, break_long_words=False)]
     return "\n".join(out)
 
 
@@ -310,7 +310,7 @@ def messages_man(catalogue, template):
     out = []
     for message in ordered(catalogue["message"]):
         for i, line in enumerate(shown_text(message)):
-            out.append(".T%s\n.B %s" % ("Q" if i else "P", roff(line.rstrip())))
+            out.append(".T%s\n.B \"%s\"" % ("Q" if i else "P", roff(line.rstrip())))
         out.append(sentences((end_words(message) + " " + message["means"]).strip()))
         if message["causes"] != "-debug.":
             out.append(".br\n.IR Causes :\n" + sentences(message["causes"]))
