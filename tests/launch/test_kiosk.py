@@ -365,8 +365,9 @@ def start_without_processes(world, *words):
 
 def allow_processes(world, launcher):
     most = resource.getrlimit(resource.RLIMIT_NPROC)[0]
-    subprocess.run(["/usr/bin/prlimit", "--pid", str(launcher.pid), "--nproc=%s:" % (most if most >= 0 else "unlimited")],
-                   user=world.uid, group=world.uid, check=True)
+    limit = "unlimited" if most == resource.RLIM_INFINITY else most
+    subprocess.run(["/usr/bin/prlimit", "--pid", str(launcher.pid), "--nproc=%s:" % limit], user=world.uid,
+                   group=world.uid, check=True)
 
 
 def test_a_failed_fork(world):
