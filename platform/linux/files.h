@@ -58,8 +58,8 @@ bool copyNewFile(const wchar_t* from, const wchar_t* to);
 
 // ---- Opening and reading -----------------------------------------------------------------------
 
-/// Opens a stream of bytes. `fp` is null on failure. This stream and the next are closed again
-/// before more than four are open: they share a few buffers.
+/// Opens a stream of bytes. `fp` is null on failure. This stream and the next must be closed again
+/// before four more are opened, open or closed as those may be: they take turns with four buffers.
 void open_file(FILE*& fp, const wchar_t* path, const wchar_t* mode);
 
 /// Opens a stream for the C library's wide output. `fp` is null on failure.

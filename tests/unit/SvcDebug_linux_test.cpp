@@ -235,13 +235,13 @@ TEST(SvcDebugOutW, TakesALongerArgument)
     EXPECT_EQ(logOf(true, [] { SvcDebugOutW(L"%s", wideA(1000).c_str()); }), a(1000) + "\n");
 }
 
-static std::string listLog(const std::wstring& name, std::initializer_list<const wchar_t*> values)
+static std::string listLog(const std::wstring& name, std::vector<std::wstring> values)
 {
-    const ArgumentVector list = words(values);
-    return logOf(true, [&] {
-        SvcDebugOutW(name.c_str(), static_cast<int>(list.size()),
-                     const_cast<wchar_t**>(list.data()));
-    });
+    std::vector<wchar_t*> list;
+    for (std::wstring& value : values)
+        list.push_back(&value[0]);
+    return logOf(true,
+                 [&] { SvcDebugOutW(name.c_str(), static_cast<int>(list.size()), list.data()); });
 }
 
 TEST(SvcDebugOutWList, WritesNameAndValuesAndAnEmptyLine)
@@ -277,13 +277,13 @@ TEST(SvcDebugOutWList, DropsANameOf1000Characters)
 
 TEST(SvcDebugOutWList, TakesValuesUpToTheLimitOfALine)
 {
-    EXPECT_EQ(listLog(L"n", {wideA(2000).c_str(), wideA(1000).c_str()}),
+    EXPECT_EQ(listLog(L"n", {wideA(2000), wideA(1000)}),
               "n=\"" + a(2000) + ", " + a(1000) + ", \"\n\n");
-    // n=" + 4087 + comma, blank, quote and the line end of the text: 4094 + 1 bytes.
-    EXPECT_EQ(listLog(L"n", {wideA(4088).c_str()}), "n=\"" + a(4088) + ", \"\n\n");
+    // 3 + 4088 bytes, comma, blank, quote and the line end of the text: 4095.
+    EXPECT_EQ(listLog(L"n", {wideA(4088)}), "n=\"" + a(4088) + ", \"\n\n");
     // One more, and the text's own line end is cut; two more, and the quote is cut as well.
-    EXPECT_EQ(listLog(L"n", {wideA(4089).c_str()}), "n=\"" + a(4089) + ", \"\n");
-    EXPECT_EQ(listLog(L"n", {wideA(4090).c_str()}), "n=\"" + a(4090) + ", \n");
+    EXPECT_EQ(listLog(L"n", {wideA(4089)}), "n=\"" + a(4089) + ", \"\n");
+    EXPECT_EQ(listLog(L"n", {wideA(4090)}), "n=\"" + a(4090) + ", \n");
 }
 
 TEST(SvcDebugLastError, IsTheSameAsTheWideForm)

@@ -2,6 +2,8 @@
 
 #include "tests/unit/support.h"
 
+#include "platform/linux/wide_strings.h"
+
 static std::vector<std::wstring> converted(std::vector<std::string> narrow)
 {
     std::vector<char*> argv;
@@ -9,7 +11,11 @@ static std::vector<std::wstring> converted(std::vector<std::string> narrow)
         argv.push_back(&word[0]);
     const int argc = static_cast<int>(argv.size());
     argv.push_back(nullptr);
-    return texts(wideArguments(argc, argv.data()));
+    const ArgumentVector wide = wideArguments(argc, argv.data());
+    const std::vector<std::wstring> result = texts(wide);
+    for (wchar_t* word : wide)
+        freeString(word);
+    return result;
 }
 
 TEST(wideArguments, GivesOneWordForEachWithoutATerminatingNull)
@@ -31,38 +37,48 @@ TEST(wideArguments, KeepsThePlaceOfAWordThatCannotBeConverted)
     EXPECT_EQ(converted({"a", "x\xff", "b"}), expected);
 }
 
+// The position of `option` among the first `count` words.
+static int positionOf(const wchar_t* option, std::vector<std::wstring> list, int count)
+{
+    ArgumentVector args;
+    for (std::wstring& word : list)
+        args.push_back(&word[0]);
+    return findOption(option, count, args.data());
+}
+
 TEST(findOption, GivesTheFirstOfSeveral)
 {
-    ArgumentVector args = words({L"velmora", L"-debug", L"-data", L"A", L"-data", L"B"});
-    EXPECT_EQ(findOption(L"-data", 6, args.data()), 2);
-    EXPECT_EQ(findOption(L"B", 6, args.data()), 5);
+    const std::vector<std::wstring> args = {L"velmora", L"-debug", L"-data", L"A", L"-data", L"B"};
+    EXPECT_EQ(positionOf(L"-data", args, 6), 2);
+    EXPECT_EQ(positionOf(L"B", args, 6), 5);
 }
 
 TEST(findOption, NeverLooksAtTheProgramPath)
 {
-    ArgumentVector args = words({L"-data", L"A", L"-data"});
-    EXPECT_EQ(findOption(L"-data", 3, args.data()), 2);
-    EXPECT_EQ(findOption(L"-data", 1, args.data()), -1);
+    const std::vector<std::wstring> args = {L"-data", L"A", L"-data"};
+    EXPECT_EQ(positionOf(L"-data", args, 3), 2);
+    EXPECT_EQ(positionOf(L"-data", args, 1), -1);
 }
 
 TEST(findOption, ComparesWholeWordsWithTheirCase)
 {
-    ArgumentVector args = words({L"velmora", L"-Data", L"-dat", L"-datax", L"--data", L" -data"});
-    EXPECT_EQ(findOption(L"-data", 6, args.data()), -1);
+    const std::vector<std::wstring> args = {L"velmora", L"-Data",  L"-dat",
+                                            L"-datax",  L"--data", L" -data"};
+    EXPECT_EQ(positionOf(L"-data", args, 6), -1);
 }
 
 TEST(findOption, LooksBehindVmargsToo)
 {
-    ArgumentVector args = words({L"velmora", L"-vmargs", L"-data"});
-    EXPECT_EQ(findOption(L"-data", 3, args.data()), 2);
+    const std::vector<std::wstring> args = {L"velmora", L"-vmargs", L"-data"};
+    EXPECT_EQ(positionOf(L"-data", args, 3), 2);
 }
 
 TEST(findOption, LooksAtSoManyWords)
 {
-    ArgumentVector args = words({L"velmora", L"a", L"-data"});
-    EXPECT_EQ(findOption(L"-data", 3, args.data()), 2);
-    EXPECT_EQ(findOption(L"-data", 2, args.data()), -1);
-    EXPECT_EQ(findOption(L"-data", 0, args.data()), -1);
+    const std::vector<std::wstring> args = {L"velmora", L"a", L"-data"};
+    EXPECT_EQ(positionOf(L"-data", args, 3), 2);
+    EXPECT_EQ(positionOf(L"-data", args, 2), -1);
+    EXPECT_EQ(positionOf(L"-data", args, 0), -1);
 }
 
 static bool haveAmong(const char* option, std::vector<std::string> narrow, int count)

@@ -547,6 +547,46 @@ TEST(openers, GiveNullWithTheReasonLeftInErrno)
     EXPECT_EQ(errno, ENOENT);
 }
 
+static FILE* openedForWriting(const TempDir& dir, const std::string& name)
+{
+    FILE* file = nullptr;
+    open_file(file, dir.wide(name).c_str(), L"w");
+    return file;
+}
+
+TEST(openers, KeepFourStreamsApart)
+{
+    TempDir dir;
+    const Names names = {"one", "two", "three", "four"};
+    std::vector<FILE*> files;
+    for (const std::string& name : names) {
+        files.push_back(openedForWriting(dir, name));
+        ASSERT_NE(files.back(), nullptr);
+        EXPECT_GE(fputs(name.c_str(), files.back()), 0);
+    }
+    for (FILE* file : files)
+        fclose(file);
+    for (const std::string& name : names)
+        EXPECT_EQ(dir.read(name), name);
+}
+
+TEST(openers, KeepAStreamApartFromTheNextThree)
+{
+    TempDir dir;
+    FILE* kept = openedForWriting(dir, "kept");
+    ASSERT_NE(kept, nullptr);
+    EXPECT_GE(fputs("kept", kept), 0);
+    for (const char* name : {"1", "2", "3"}) {
+        FILE* file = openedForWriting(dir, name);
+        ASSERT_NE(file, nullptr);
+        EXPECT_GE(fputs(name, file), 0);
+        fclose(file);
+        EXPECT_EQ(dir.read(name), name);
+    }
+    fclose(kept);
+    EXPECT_EQ(dir.read("kept"), "kept");
+}
+
 TEST(openers, CannotOpenAPathThatTheLocaleCannotConvert)
 {
     FILE* file = stdin;
