@@ -52,6 +52,15 @@ def test_a_second_start_makes_nothing_new(world):
     assert tree("/mnt") == before
 
 
+def test_a_first_start_has_nothing_to_reset(world):
+    """Not even a part of the area needs to have been there."""
+    world.install()
+    world.write(CONFIG + "/mine")
+    world.run("-resetconfig")
+    assert os.path.exists(CONFIG + "/mine")
+    assert not os.path.exists(CONFIG + "bak")
+
+
 def test_the_area_of_a_service_lies_in_the_installation(world):
     """Its configuration stands beside the workspace, and the user's home stays empty."""
     world.install("service", "jvm.location=" + JAVA)

@@ -23,7 +23,10 @@ def forked(world):
 def sleeps_with_lock_file(pid):
     """It has opened the lock file and sleeps; up to the lock itself nothing else would make it sleep."""
     folder = "/proc/%d/fd/" % pid
-    return state(pid) == "S" and LOCK in [os.readlink(folder + name) for name in os.listdir(folder)]
+    try:
+        return state(pid) == "S" and LOCK in [os.readlink(folder + name) for name in os.listdir(folder)]
+    except FileNotFoundError:  # one was closed in between
+        return False
 
 
 # ---- waiting

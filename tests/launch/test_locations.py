@@ -218,10 +218,27 @@ def test_an_installation_that_is_taken_away_meanwhile(world):
 
 
 def test_a_system_that_does_not_tell_the_executable(world):
+    if world.sanitized:
+        pytest.skip("a sanitizer asks for the executable too, and complains on standard error")
     world.install()
     start = world.run(strace=["-e", "trace=readlink,readlinkat", "-e",
                               "inject=readlink,readlinkat:error=EACCES"])
     world.fatal(start, "QVMRL0184E: Getting command path failed! errno = 13", "Permission denied")
+
+
+def test_an_executable_whose_path_is_too_long(world):
+    """It can be started from the folder below which it lies, but not be told."""
+    if world.sanitized:
+        pytest.skip("a sanitizer asks for the executable too, and complains on standard error")
+    os.chdir("/mnt")
+    for _ in range(21):
+        os.mkdir("x" * 200)
+        os.chdir("x" * 200)
+    with open("velmora", "wb", opener=lambda path, flags: os.open(path, flags, 0o755)) as file:
+        file.write(world._launcher)
+    start = world.run(program="./velmora", cwd=".")
+    os.chdir("/")
+    world.fatal(start, "QVMRL0184E: Getting command path failed! errno = 36", "File name too long")
 
 
 # ---- the id of the installation

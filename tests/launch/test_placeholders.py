@@ -2,7 +2,7 @@
 
 import pytest
 
-from world import INSTALL_AREA, WORKSPACE
+from world import INSTALL_AREA, WORKSPACE, lines, read, user_logs
 
 
 def shown(world, *texts, words=(), env=None):
@@ -129,3 +129,17 @@ def test_values_that_only_grow_are_replaced_to_the_end(world):
     argv = world.only_platform().argv
     assert "-Drcp.home=" + app in argv
     assert "-Dx=/mnt//mnt/w" in argv
+
+
+def test_each_replacement_is_traced(world):
+    """The whole text before and after it, from right to left. A variable that is not set is told with an empty line."""
+    shown(world, "-Dx=${prop.a}-${env.NOSUCH,d}", "a=${env.USER}", words=["-debug"])
+    log = read(user_logs()[0])
+    begin = log.index("QVMRL0081I:  Environmental variable 'NOSUCH'")
+    assert log[begin:].startswith(lines(
+        "QVMRL0081I:  Environmental variable 'NOSUCH' is not set",
+        "",
+        "QVMRL0071I: Modified prop_contents ${prop.a}-${env.NOSUCH,d} => ${prop.a}-d",
+        "QVMRL0071I: Modified prop_contents ${prop.a}-d => ${env.USER}-d",
+        "QVMRL0071I: Modified prop_contents ${env.USER}-d => anna-d",
+        "QVMRL0071I: Modified prop_contents ${env.USER} => anna"))

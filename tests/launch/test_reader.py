@@ -45,6 +45,7 @@ def shown_again(world, **how):
     (r"-Da=\u41xy", "-Da=A"),
     (r"-Da=\u41", "-Da=A"),
     (r"-Da=1\u0020", "-Da=1"),
+    (r"-Da=\u0020\u0020\u0020", "-Da=   "),
     (r"-Da=1\u0000234", "-Da=1"),
     (r"-Da=\u005cx", r"-Da=\x"),
     (r"-Da\u0042=1", r"-Da\u0042=1"),
@@ -54,7 +55,7 @@ def shown_again(world, **how):
 ])
 def test_one_line(world, text, word):
     """Separators, escapes and blanks: keys know no escape, a value's leading separators are swallowed, even escaped
-    ones; only blanks are trimmed, tabs stay."""
+    ones; only blanks are trimmed, tabs stay, and so do blanks where there is nothing else."""
     assert shown(world, text) == [word]
 
 
@@ -210,6 +211,14 @@ def test_reading_is_traced_line_by_line(world):
         'QVMRL0032I: Prop Line = "java.home=/j"',
         'QVMRL0023I:   attrib = "java.home"',
     )
+
+
+def test_a_long_line_is_traced_whole(world):
+    """The limit of 999 characters is one for formats."""
+    world.install()
+    world.jvm_properties("-Da=" + "x" * 2000)
+    world.run("-debug")
+    assert 'QVMRL0032I: Prop Line = "-Da=%s"\n' % ("x" * 2000) in read(user_logs()[0])
 
 
 def test_a_computed_property_is_traced_too(world):

@@ -79,6 +79,16 @@ def test_a_daemon_process_makes_the_user_area_too(world):
     assert not os.path.exists(MAIN)
 
 
+def test_a_daemon_process_never_provisions(world):
+    """Though its area is new and the installation asks for it."""
+    world.install("user", "provisioning=true", "provisioning.application=org.prov")
+    world.folder(os.path.dirname(LOCK))
+    holder = world.holder(ECLIPSE)
+    world.write(LOCK, "%d          " % holder.pid)
+    assert world.run().status == 0
+    assert world.only_platform().argv == daemon(holder.pid)
+
+
 def test_workspaces_do_not_know_of_each_other(world):
     world.install()
     world.plan("wait")

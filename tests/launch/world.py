@@ -143,6 +143,7 @@ class Start:
 class World:
     def __init__(self, launcher, stand_in, uid=1000):
         self.uid = uid
+        self.sanitized = b"__asan_init" in launcher
         self._launcher, self._stand_in = launcher, stand_in
         self._starts, self._holders = [], []
 
@@ -366,7 +367,8 @@ def temp_logs():
 
 def user_logs():
     """The logs in all user areas."""
-    return sorted(str(path) for path in pathlib.Path("/mnt").rglob("velmora*.log") if path.parent.name == "logs")
+    return sorted(os.path.join(folder, name) for folder, _, names in os.walk("/mnt") for name in names
+                  if os.path.basename(folder) == "logs" and re.fullmatch(r"velmora.*\.log", name))
 
 
 def tree(top):
