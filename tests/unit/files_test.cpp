@@ -302,8 +302,10 @@ TEST(placeForNewFile, IsTheTargetItselfWhenItCannotBeLookedAt)
     dir.makeDir("closed");
     fs::permissions(dir.path("closed"), fs::perms::none);
     giveToOrdinaryUser(dir.dir);
-    EXPECT_TRUE(holdsAsOrdinaryUser(
-        [&] { EXPECT_EQ(placeForNewFile(dir.wide("closed/new")), dir.wide("closed/new")); }));
+    EXPECT_TRUE(holdsAsOrdinaryUser([&] {
+        EXPECT_EQ(placeForNewFile(dir.wide("closed/new")), dir.wide("closed/new"));
+        fs::permissions(dir.path("closed"), fs::perms::owner_all);
+    }));
 }
 
 TEST(openNewFile, OpensThePlaceForWideOutput)
