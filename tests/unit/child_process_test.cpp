@@ -104,6 +104,8 @@ TEST(startChild, HandsNoDescriptorOfItsOwnOn)
 {
     const std::set<std::string> before = openedBy("self");
     const ChildStart start = startedWaiting();
+    // Before that it has its libraries open.
+    EXPECT_TRUE(waitUntilAsleep(start.pid));
     const std::set<std::string> childs = openedBy(std::to_string(start.pid));
     const std::set<std::string> after = openedBy("self");
     ended(start);
