@@ -71,6 +71,46 @@ static std::wstring fixedUp(std::wstring path)
 // ${prop.java.home}
 static const std::wstring HOME = L"${prop.java.home}";
 
+TEST(replaceEvery, TellsWhetherItCameToAnEnd)
+{
+    std::wstring s = L"a${x}b${x}";
+    EXPECT_TRUE(replaceEvery(L"${x}", L"1", s));
+    EXPECT_EQ(s, L"a1b1");
+    EXPECT_TRUE(replaceEvery(L"${x}", L"${x}", s));
+    EXPECT_EQ(s, L"a1b1");
+    s = L"a${x}";
+    EXPECT_FALSE(replaceEvery(L"${x}", L"-${x}-", s));
+    EXPECT_EQ(s, L"a${x}");
+}
+
+TEST(replaceEvery, ValuesThatOnlyGrowAreReplacedToTheEnd)
+{
+    // A hundred of them, and what they bring in is a hundred times as long.
+    std::wstring s;
+    std::wstring wanted;
+    const std::wstring value(500, L'v');
+    for (int i = 0; i < 100; ++i) {
+        s += L"${x}";
+        wanted += value;
+    }
+    EXPECT_TRUE(replaceEvery(L"${x}", value, s));
+    EXPECT_EQ(s, wanted);
+}
+
+TEST(replaceEvery, ValueThatNeverStopsCompletingAPlaceholderIsFound)
+{
+    // With a for "${" and b for "x}" this puts bbaa for ab, and abb grows for ever: abb, bbaab,
+    // bbabbaa, which holds abb again.
+    std::wstring s = L"${x}x}";
+    EXPECT_FALSE(replaceEvery(L"${x}", L"x}x}${${", s));
+    EXPECT_FATAL(
+        {
+            std::wstring text = L"${rcp.home}home}";
+            replaceStdPlaceholders(L"/ws", L"home}home}${rcp.${rcp.", text);
+        },
+        "QVMRL0088E: property substitution is invalid (home}home}");
+}
+
 TEST(replaceStdPlaceholders, EveryOneOfTheThree)
 {
     EXPECT_EQ(standard(L"a${rcp.home}b${rcp.home}"), (Outcome{true, L"a/rcpb/rcp"}));
@@ -419,6 +459,20 @@ TEST(replaceUserPlaceholders, StepTowardsTheStartBeginsTheCountAnew)
 {
     const std::unique_ptr<OwnList> ten(chain(10));
     EXPECT_EQ(user(L"${prop.p1}${prop.p1}${prop.p1}", ten->list), (Outcome{true, L"endendend"}));
+}
+
+TEST(replaceUserPlaceholders, ValueThatBringsItselfInBesideAnotherFails)
+{
+    // Each round puts in "${prop.d}${prop.a}" (18 characters, counted as 19) and the value of a,
+    // and begins the count of repetitions again. 2^24 = 16777216 may be brought in like this; the
+    // very first value is free.
+    const OwnList empty({L"d", L"${prop.d}${prop.a}", L"a", L""});
+    // 838860 rounds of 1 + 19 leave 16: 1 for the a, and then 15 are too few for the other.
+    EXPECT_EQ(user(L"${prop.d}", empty.list), (Outcome{false, L"${prop.d}${prop.a}"}));
+    const OwnList growing({L"d", L"${prop.d}${prop.a}", L"a", L"1"});
+    // 798915 rounds of 2 + 19 leave 1: the next a, number 798916, is one too many.
+    EXPECT_EQ(user(L"${prop.d}", growing.list),
+              (Outcome{false, L"${prop.d}" + std::wstring(798916, L'1')}));
 }
 
 TEST(replaceUserPlaceholders, ValueWithManyPlaceholdersIsNoRepetition)
