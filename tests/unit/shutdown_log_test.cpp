@@ -1,0 +1,241 @@
+#include "platform/linux/shutdown_log.h"
+
+#include "tests/unit/support.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <ctime>
+#include <unistd.h>
+
+// The lines "Started <first>" to "Started <last>".
+static std::string history(int first, int last)
+{
+    std::string lines;
+    for (int i = first; i <= last; ++i)
+        lines += "Started " + std::to_string(i) + "\n";
+    return lines;
+}
+
+static std::string startedAt(time_t now)
+{
+    struct tm local = {};
+    char text[64] = "";
+    localtime_r(&now, &local);
+    return std::string("Started ") + asctime_r(&local, text);
+}
+
+// What becomes of a history with these bytes.
+static std::string truncated(const std::string& bytes)
+{
+    TempDir dir;
+    dir.write("shutdown.log", bytes);
+    truncateShutdownLog(dir.wdir);
+    EXPECT_FALSE(dir.has("shutdown.log.new"));
+    return dir.read("shutdown.log");
+}
+
+TEST(updateShutdownLog, WritesTheLocalTimeOfTheStart)
+{
+    setenv("TZ", "XYZ-5:30", 1);
+    TempDir dir;
+    const time_t before = time(nullptr);
+    updateShutdownLog(dir.wdir);
+    const time_t after = time(nullptr);
+    const std::string line = dir.read("shutdown.log");
+    bool found = false;
+    for (time_t now = before; now <= after; ++now)
+        found = found || line == startedAt(now);
+    EXPECT_TRUE(found) << line;
+    // Started Mon Oct 24 09:30:15 2011, and a line end.
+    EXPECT_EQ(line.size(), 8u + 25u);
+    EXPECT_EQ(line.back(), '\n');
+}
+
+TEST(updateShutdownLog, AddsALineToTheOthers)
+{
+    TempDir dir;
+    dir.write("shutdown.log", "Started before\n");
+    updateShutdownLog(dir.wdir);
+    const std::string lines = dir.read("shutdown.log");
+    EXPECT_EQ(lines.substr(0, 23), "Started before\nStarted ");
+    EXPECT_EQ(lines.size(), 15u + 33u);
+}
+
+TEST(updateShutdownLog, TurnsBackslashes)
+{
+    TempDir dir;
+    dir.makeDir("logs");
+    updateShutdownLog(dir.wdir + L"\\logs");
+    EXPECT_TRUE(dir.has("logs/shutdown.log"));
+}
+
+TEST(updateShutdownLog, EndsWhenTheFileCannotBeOpened)
+{
+    TempDir dir;
+    EXPECT_TRUE(endsWith(
+        [&] { updateShutdownLog(dir.wdir + L"/no"); },
+        "QVMRL0098E: Could not open " + dir.path("no/shutdown.log") + " for writing!", ENOENT));
+    dir.makeDir("shutdown.log");
+    EXPECT_TRUE(endsWith([&] { updateShutdownLog(dir.wdir); },
+                         "QVMRL0098E: Could not open " + dir.path("shutdown.log") + " for writing!",
+                         EISDIR));
+}
+
+TEST(updateShutdownLog, EndsWhenTheDiskIsFull)
+{
+    TempDir dir;
+    ASSERT_EQ(symlink("/dev/full", dir.path("shutdown.log").c_str()), 0);
+    EXPECT_TRUE(endsWith([&] { updateShutdownLog(dir.wdir); },
+                         "QVMRL0118E: Error writing to " + dir.path("shutdown.log") + " file.",
+                         ENOSPC));
+}
+
+TEST(truncateShutdownLog, A199LinesStay)
+{
+    EXPECT_EQ(truncated(history(1, 199)), history(1, 199));
+    EXPECT_EQ(truncated(""), "");
+    EXPECT_EQ(truncated("Started 1"), "Started 1");
+}
+
+TEST(truncateShutdownLog, DeliberatelyKeeps101Of200Lines)
+{
+    EXPECT_EQ(truncated(history(1, 200)), history(100, 200));
+}
+
+TEST(truncateShutdownLog, KeepsTheLast101Lines)
+{
+    EXPECT_EQ(truncated(history(1, 201)), history(101, 201));
+    EXPECT_EQ(truncated(history(1, 400)), history(300, 400));
+}
+
+TEST(truncateShutdownLog, LastLineNeedsNoEndAndGetsOne)
+{
+    EXPECT_EQ(truncated(history(1, 199) + "Started 200"), history(100, 200));
+    EXPECT_EQ(truncated(history(1, 198) + "Started 199"), history(1, 198) + "Started 199");
+}
+
+TEST(truncateShutdownLog, EmptyLinesDoNotCount)
+{
+    EXPECT_EQ(truncated(history(1, 100) + "\n\n\n" + history(101, 199)),
+              history(1, 100) + "\n\n\n" + history(101, 199));
+    EXPECT_EQ(truncated(history(1, 150) + "\n\n" + history(151, 200) + "\n"), history(100, 200));
+}
+
+TEST(truncateShutdownLog, ReadThatFailsEndsTheCount)
+{
+    EXPECT_EQ(truncated("\n" + history(1, 300)), "\n" + history(1, 300));
+}
+
+TEST(truncateShutdownLog, LineOf2024BytesIsOne)
+{
+    const std::string longest(2024, 'x');
+    EXPECT_EQ(truncated(history(1, 198) + longest + "\n"), history(1, 198) + longest + "\n");
+    EXPECT_EQ(truncated(history(1, 199) + longest + "\n"), history(100, 199) + longest + "\n");
+}
+
+TEST(truncateShutdownLog, LongerLineCountsInPieces)
+{
+    const std::string longest(2024, 'x');
+    EXPECT_EQ(truncated(history(1, 198) + longest + "y\n"), history(100, 198) + longest + "\ny\n");
+    // 197 lines and three pieces.
+    EXPECT_EQ(truncated(history(1, 197) + longest + longest + "y\n"),
+              history(100, 197) + longest + "\n" + longest + "\ny\n");
+}
+
+TEST(truncateShutdownLog, BytesAreTheLocales)
+{
+    std::string lines;
+    for (int i = 0; i < 101; ++i)
+        lines += "Started \xc3\xa9\xe2\x82\xac\n";
+    EXPECT_EQ(truncated(history(1, 99) + lines), lines);
+}
+
+TEST(truncateShutdownLog, LeftoverOfAnEarlierCutIsOverwritten)
+{
+    TempDir dir;
+    dir.write("shutdown.log", history(1, 200));
+    dir.write("shutdown.log.new", history(1, 1000));
+    truncateShutdownLog(dir.wdir);
+    EXPECT_EQ(dir.read("shutdown.log"), history(100, 200));
+    EXPECT_FALSE(dir.has("shutdown.log.new"));
+}
+
+TEST(truncateShutdownLog, LogsWhenThereIsNoFile)
+{
+    TempDir dir;
+    EXPECT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir + L"\\logs"); }),
+              "QVMRL0138E: Unable to open file.\"" + dir.path("logs/shutdown.log") + "\"\n");
+}
+
+TEST(truncateShutdownLog, LogsWhenTheNewFileCannotBeOpened)
+{
+    TempDir dir;
+    dir.write("shutdown.log", history(1, 200));
+    dir.makeDir("shutdown.log.new");
+    EXPECT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
+              "QVMRL0105E: Unable to open file for writing.\"" + dir.path("shutdown.log.new") +
+                  "\"\n");
+    EXPECT_EQ(dir.read("shutdown.log"), history(1, 200));
+}
+
+TEST(truncateShutdownLog, LogsWhenTheDiskIsFull)
+{
+    TempDir dir;
+    dir.write("shutdown.log", history(1, 200));
+    ASSERT_EQ(symlink("/dev/full", dir.path("shutdown.log.new").c_str()), 0);
+    EXPECT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
+              "QVMRL0137E: Error while truncating file.\"" + dir.path("shutdown.log") + "\"\n");
+    EXPECT_EQ(dir.read("shutdown.log"), history(1, 200));
+}
+
+TEST(truncateShutdownLog, LogsWhenAWriteFailsBeforeTheEnd)
+{
+    // Long lines, so that the stream is full before the last one.
+    TempDir dir;
+    std::string lines;
+    for (int i = 0; i < 250; ++i)
+        lines += std::string(1000, 'x') + "\n";
+    dir.write("shutdown.log", lines);
+    ASSERT_EQ(symlink("/dev/full", dir.path("shutdown.log.new").c_str()), 0);
+    EXPECT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
+              "QVMRL0137E: Error while truncating file.\"" + dir.path("shutdown.log") + "\"\n");
+    EXPECT_EQ(dir.read("shutdown.log"), lines);
+}
+
+TEST(truncateShutdownLog, SaysNothingWhenAllIsWell)
+{
+    TempDir dir;
+    dir.write("shutdown.log", history(1, 200));
+    EXPECT_EQ(logOf(true, [&] { truncateShutdownLog(dir.wdir); }), "");
+}
+
+TEST(doShutdownLogUpdate, AddsALineThenCuts)
+{
+    TempDir dir;
+    dir.write("logs/shutdown.log", history(1, 199));
+    doShutdownLogUpdate(dir.wdir);
+    const std::string lines = dir.read("logs/shutdown.log");
+    const std::string kept = history(100, 199);
+    EXPECT_EQ(lines.substr(0, kept.size()), kept);
+    EXPECT_EQ(lines.size(), kept.size() + 33u);
+}
+
+TEST(doShutdownLogUpdate, A198LinesBecome199)
+{
+    TempDir dir;
+    dir.write("logs/shutdown.log", history(1, 198));
+    doShutdownLogUpdate(dir.wdir);
+    const std::string lines = dir.read("logs/shutdown.log");
+    EXPECT_EQ(lines.substr(0, history(1, 198).size()), history(1, 198));
+    EXPECT_EQ(lines.size(), history(1, 198).size() + 33u);
+}
+
+TEST(doShutdownLogUpdate, EndsWithoutALogDirectory)
+{
+    TempDir dir;
+    EXPECT_TRUE(endsWith(
+        [&] { doShutdownLogUpdate(dir.wdir); },
+        "QVMRL0098E: Could not open " + dir.path("logs/shutdown.log") + " for writing!", ENOENT));
+}
