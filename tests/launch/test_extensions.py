@@ -52,10 +52,15 @@ def test_an_extension_with_words_for_both_sides(world):
     assert started(world, "-config", "a", "-vmargs", "-Xmx1g") == command("-nosplash", jvm=["-Xmx1g", "-Xss2m"])
 
 
-def test_a_second_vmargs_word_of_an_extension_is_dropped_before_its_jvm_words_and_kept_among_them(world):
-    """The one that divides the words is not added; the JVM's words are, whatever they are."""
+def test_a_second_vmargs_word_of_an_extension_is_dropped_like_the_first(world):
+    """When the line has one of its own; else both are words like any other."""
     world.install("user", *extension("-p", "-vmargs", "-j", "-vmargs", "-k"))
-    assert started(world, "-config", "a", "-vmargs", "-x") == command("-p", jvm=["-x", "-j", "-vmargs", "-k"])
+    assert started(world, "-config", "a", "-vmargs", "-x") == command("-p", jvm=["-x", "-j", "-k"])
+
+
+def test_a_second_vmargs_word_of_an_extension_when_the_line_has_none(world):
+    world.install("user", *extension("-p", "-vmargs", "-j", "-vmargs", "-k"))
+    assert started(world, "-config", "a") == command("-p", jvm=["-j", "-vmargs", "-k"])
 
 
 def test_the_numbers_have_no_gap(world):
