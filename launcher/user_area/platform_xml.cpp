@@ -63,17 +63,16 @@ static void logFailedWrite()
 static void copyTemplate(FILE* from, FILE* to, const PropertyList& props, bool replaceFeatureLines)
 {
     wchar_t text[LINE_ROOM];
-    while (readCopiedLine(from, text)) {
+    bool written = true;
+    while (written && readCopiedLine(from, text)) {
         std::wstring line = text;
         if (!fillIn(line, JVM_FEATURE, props, replaceFeatureLines) ||
             !fillIn(line, PARENT_FEATURE, props, replaceFeatureLines))
             break;
-        if (fwprintf(to, L"%ls\n", line.c_str()) < 0) {
-            logFailedWrite();
-            break;
-        }
+        written = fwprintf(to, L"%ls\n", line.c_str()) >= 0;
     }
-    if (!flushToDisk(to))
+    // A write that failed fails again here, and is one failure.
+    if (!flushToDisk(to) || !written)
         logFailedWrite();
 }
 
