@@ -391,4 +391,4 @@ def test_a_first_start_killed_at_any_step(world):
         assert sorted(name for name in found if name.startswith("logs/")) == [
             "logs/", "logs/shutdown.log", "logs/velmora.log"], step
         steps += 1
-    assert steps > 30
+    assert steps > 20

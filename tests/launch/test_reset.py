@@ -446,7 +446,7 @@ def test_a_reset_killed_at_any_step_and_an_ordinary_start(world):
         left |= leftovers(found)
         outcomes.add(("mine.prefs" in config, "org.eclipse.update/registry" in config))
         steps += 1
-    assert steps > 30
+    assert steps > 20
     assert outcomes == {(True, True), (False, False), (False, True)}
     assert left == documented_leftovers() == {"registry.old", "bookmarks.xml.old", ".configbakdeleteme000N"}
 

@@ -459,7 +459,7 @@ def test_a_launcher_killed_at_any_step(world):
         left |= leftovers(found)
         in_place.add(os.path.exists(UPDATE + "/registry"))
         steps += 1
-    assert steps > 30
+    assert steps > 20
     assert in_place == {True, False}
     assert left == {"registry.old", "bookmarks.xml.old", ".configbakdeleteme000N"}
     assert left <= documented_leftovers()
