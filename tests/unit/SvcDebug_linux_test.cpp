@@ -778,6 +778,7 @@ TEST(waitForDeletionOfDebugFile, SleepsUntilTheMarkerIsGone)
         EXPECT_FALSE(dir.has("rcp/prov.debug/debug.txt"));
     });
     EXPECT_TRUE(waitUntilAsleep(child)) << "it did not wait";
+    EXPECT_TRUE(waitUntilAsleepAgain(child)) << "it waited once";
     fs::remove(dir.path("rcp/prov.debug/debug.txt"));
     EXPECT_EQ(statusOf(child), 0);
 }

@@ -175,18 +175,44 @@ bool makeFail(long systemCall, int reason)
            prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) == 0;
 }
 
+// The letter of the process's state, 'X' when it is gone.
+static char stateOf(pid_t child)
+{
+    const std::string stat = bytesOf("/proc/" + std::to_string(child) + "/stat");
+    const std::string::size_type name = stat.rfind(") ");
+    return name == std::string::npos ? 'X' : stat[name + 2];
+}
+
+// How often the process has gone to sleep of its own accord.
+static long sleepsOf(pid_t child)
+{
+    const std::string status = bytesOf("/proc/" + std::to_string(child) + "/status");
+    const std::string name = "\nvoluntary_ctxt_switches:";
+    const std::string::size_type at = status.find(name);
+    return at == std::string::npos ? 0 : std::stol(status.substr(at + name.size()));
+}
+
+// Waits until the process sleeps and has gone to sleep more than `sleeps` times.
+static bool waitForSleep(pid_t child, long sleeps)
+{
+    for (;;) {
+        const char state = stateOf(child);
+        if (state == 'Z' || state == 'X')
+            return false;
+        if (state == 'S' && sleepsOf(child) > sleeps)
+            return true;
+        usleep(1000);
+    }
+}
+
 bool waitUntilAsleep(pid_t child)
 {
-    const std::string path = "/proc/" + std::to_string(child) + "/stat";
-    for (;;) {
-        const std::string stat = bytesOf(path);
-        const std::string::size_type name = stat.rfind(") ");
-        if (name == std::string::npos || stat[name + 2] == 'Z' || stat[name + 2] == 'X')
-            return false;
-        if (stat[name + 2] == 'S')
-            return true;
-        sched_yield();
-    }
+    return waitForSleep(child, -1);
+}
+
+bool waitUntilAsleepAgain(pid_t child)
+{
+    return waitForSleep(child, sleepsOf(child));
 }
 
 void boundMemory(size_t more)

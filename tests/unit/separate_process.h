@@ -56,6 +56,9 @@ bool makeFail(long systemCall, int reason);
 /// Waits until the process sleeps in a system call. False when it ended instead.
 bool waitUntilAsleep(pid_t child);
 
+/// Waits until a process that sleeps has woken up and sleeps again. False when it ended instead.
+bool waitUntilAsleepAgain(pid_t child);
+
 /// From now on the process may take `more` bytes of memory beyond what it has. Without effect under
 /// the address sanitizer.
 void boundMemory(size_t more);

@@ -149,7 +149,8 @@ TEST(logoff, EndsWithStatus1WhateverBecameOfKillall)
     EXPECT_EQ(statusOf([&] {
                   session.enter();
                   setenv("PATH", session.dir.path("nowhere").c_str(), 1);
-                  freopen("/dev/null", "w", stderr);
+                  // The shell says that it has no such command.
+                  close(STDERR_FILENO);
                   logoff();
               }),
               1);
