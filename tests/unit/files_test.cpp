@@ -308,17 +308,16 @@ TEST(placeForNewFile, IsTheTargetItselfWhenItCannotBeLookedAt)
     }));
 }
 
-TEST(openNewFile, OpensThePlaceForWideOutput)
+TEST(openNewFile, OpensThePlace)
 {
     TempDir dir;
     std::wstring place = dir.wide("new.part");
     FILE* file = openNewFile(place, dir.wide("new").c_str(), L"w");
     ASSERT_NE(file, nullptr);
-    EXPECT_GT(fwide(file, 0), 0);
     EXPECT_EQ(place, dir.wide("new.part"));
-    EXPECT_GE(fputws(L"caf\u00e9", file), 0);
+    EXPECT_EQ(write(fileno(file), "x", 1), 1);
     fclose(file);
-    EXPECT_EQ(dir.read("new.part"), "caf\xc3\xa9");
+    EXPECT_EQ(dir.read("new.part"), "x");
     EXPECT_FALSE(dir.has("new"));
 }
 
