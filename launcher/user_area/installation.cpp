@@ -5,6 +5,7 @@
 #include "launcher/properties/property_file.h"
 #include "platform/linux/files.h"
 #include "platform/linux/paths.h"
+#include "platform/linux/wide_output.h"
 
 #include <cstdio>
 #include <cwchar>
@@ -54,7 +55,7 @@ bool startsJvmDirectly()
 static void appendInstallID(const std::wstring& path, const wchar_t* id)
 {
     FILE* file = nullptr;
-    open_wfile(file, path.c_str(), L"a+");
+    open_file(file, path.c_str(), L"a+");
     if (file == nullptr) {
         fatalErrorA("QVMRL0017E: Could not open %ls to append rcp.install.id!", path.c_str(),
                     EXIT_PROCESS, WITH_ERRNO);
@@ -62,7 +63,7 @@ static void appendInstallID(const std::wstring& path, const wchar_t* id)
     }
     // Deliberate: nothing is written before it. Behind a last line without a line end it becomes a
     // part of that line, and the next start makes up another id.
-    if (fwprintf(file, L"rcp.install.id=%ls\n", id) < 0 || fflush(file) != 0)
+    if (!putWide(file, std::wstring(L"rcp.install.id=") + id + L"\n") || fflush(file) != 0)
         fatalErrorA("QVMRL0018E: Error while writing to %ls file.", path.c_str(), EXIT_PROCESS,
                     WITH_ERRNO);
     fclose(file);

@@ -6,6 +6,7 @@
 #include "launcher/user_area/installation.h"
 #include "platform/linux/files.h"
 #include "platform/linux/paths.h"
+#include "platform/linux/wide_output.h"
 
 #include <cstdio>
 #include <cwchar>
@@ -69,7 +70,7 @@ static void copyTemplate(FILE* from, FILE* to, const PropertyList& props, bool r
         if (!fillIn(line, JVM_FEATURE, props, replaceFeatureLines) ||
             !fillIn(line, PARENT_FEATURE, props, replaceFeatureLines))
             break;
-        written = fwprintf(to, L"%ls\n", line.c_str()) >= 0;
+        written = putWide(to, line + L"\n");
     }
     // A write that failed fails again here, and is one failure.
     if (!flushToDisk(to) || !written)

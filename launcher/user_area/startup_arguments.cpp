@@ -9,6 +9,7 @@
 #include "platform/linux/files.h"
 #include "platform/linux/paths.h"
 #include "platform/linux/process.h"
+#include "platform/linux/wide_output.h"
 
 #include <cstdio>
 #include <cwchar>
@@ -23,7 +24,7 @@ struct Record {
     {
         std::wstring line;
         convWcharTo8859_1(key, value, line);
-        if (fwprintf(file, L"%ls\n", line.c_str()) < 0)
+        if (!putWide(file, line + L"\n"))
             fatalErrorA(message, path.c_str(), EXIT_PROCESS, WITH_ERRNO);
     }
 };
@@ -65,7 +66,7 @@ void writeStartupArgs(int argc, wchar_t** argv, const std::wstring& configDir,
 {
     Record record = {nullptr, configDir + L"/args.properties"};
     convertToOsSeparator(record.path);
-    open_wfile(record.file, record.path.c_str(), L"w+");
+    open_file(record.file, record.path.c_str(), L"w+");
     if (record.file == nullptr) {
         fatalErrorA("QVMRL0097E: Could not open %ls for writing!", record.path.c_str(),
                     EXIT_PROCESS, WITH_ERRNO);

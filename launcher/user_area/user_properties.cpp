@@ -8,6 +8,7 @@
 #include "launcher/user_area/installation.h"
 #include "platform/linux/files.h"
 #include "platform/linux/paths.h"
+#include "platform/linux/wide_output.h"
 
 #include <cstdio>
 #include <cwchar>
@@ -95,7 +96,7 @@ static void copyLines(FILE* from, FILE* to)
     wchar_t text[LINE_ROOM];
     while (readCopiedLine(from, text)) {
         std::wstring line = text;
-        if (!filter.takes(line) || fwprintf(to, L"%ls\n", line.c_str()) >= 0)
+        if (!filter.takes(line) || putWide(to, line + L"\n"))
             continue;
         const ForcedTrace forced;
         SvcDebugOutA("QVMRL0001E: Error while copying base rcpinstall.properties to user specific "
@@ -137,7 +138,7 @@ static std::wstring installationBlock(const PropertyList& props)
 static void appendBlock(const std::wstring& block, FILE* to)
 {
     // Deliberate: the block is its own format, so two per-cent signs in a value come out as one.
-    if (fputws(formatOfItself(block).c_str(), to) >= 0 && flushToDisk(to))
+    if (putWide(to, formatOfItself(block)) && flushToDisk(to))
         return;
     const ForcedTrace forced;
     SvcDebugOutA(
@@ -154,7 +155,7 @@ int fixUserRCPInstallProperties(const std::wstring& /*workspaceDir*/, std::wstri
     FILE* to = nullptr;
     // Both are opened before either is looked at, so a new file comes to be in any case.
     open_file(from, userPath.c_str(), L"r");
-    open_wfile(to, newPath.c_str(), L"w");
+    open_file(to, newPath.c_str(), L"w");
     if (from == nullptr || to == nullptr) {
         const ForcedTrace forced;
         SvcDebugOutA("QVMRL0074E: Unable to open user specific rcpinstall.properties and temporary "

@@ -83,7 +83,9 @@ bool handleCopy(const std::wstring& dstDir, const std::wstring& dstName, const s
     if (move) {
         if (!moveFile(source.c_str(), destination.c_str()))
             endWith("QVMRL0141E: Can't move file/dir  '%ls'", source);
-    } else if (!copyFile(source.c_str(), destination.c_str())) {
+    } else if (!copyNewFile(source.c_str(), destination.c_str())) {
+        // Decision: written aside, too. A copy cut short by a kill would be carried over by a later
+        // renewal that finds no registry to copy again.
         endWith("QVMRL0113E: Can't copy file  '%ls'", source);
     }
     return true;

@@ -1,6 +1,7 @@
 #include "platform/linux/files.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "platform/linux/wide_output.h"
 #include "platform/linux/wide_strings.h"
 
 #include <cerrno>
@@ -82,7 +83,7 @@ static const char* copyText(FILE* in, FILE* out)
     static const int PIECE = 1001;
     wchar_t piece[PIECE];
     while (fgetws(piece, PIECE, in) != nullptr) {
-        if (fputws(piece, out) < 0)
+        if (!putWide(out, piece))
             return "QVMRL0192E: Encountered error copying file contents";
     }
     // Decision: a directory, or bytes that the locale cannot decode, end here.
@@ -149,11 +150,11 @@ std::wstring placeForNewFile(const std::wstring& target)
 FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mode)
 {
     FILE* file = nullptr;
-    open_wfile(file, place.c_str(), mode);
+    open_file(file, place.c_str(), mode);
     if (file == nullptr && place != target) {
         // Something is in the way of the place aside; the reason that counts is the target's.
         place = target;
-        open_wfile(file, target, mode);
+        open_file(file, target, mode);
     }
     return file;
 }
@@ -171,8 +172,7 @@ bool copyNewFile(const wchar_t* from, const wchar_t* to)
 }
 
 // A buffer for a stream that is closed again by the function that opens it; at most two of these are
-// open at a time. Without one of its own a stream asks for the file's block size first, and one
-// for wide output writes sixteen bytes at a time.
+// open at a time. Without one of its own a stream asks for the file's block size first.
 static void giveBuffer(FILE* fp)
 {
     static char buffers[4][4096];

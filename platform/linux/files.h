@@ -42,7 +42,7 @@ bool copyFile(const wchar_t* from, const wchar_t* to);
 /// whole or not at all; `target` itself when something does.
 std::wstring placeForNewFile(const std::wstring& target);
 
-/// Opens `place`, or `target` when that cannot be had, for wide output; `place` becomes the one
+/// Opens `place`, or `target` when that cannot be had, for output; `place` becomes the one
 /// that was opened. Null on failure, with the errno of the target.
 FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mode);
 

@@ -3,6 +3,7 @@
 #include "diag/SvcDebug_linux.h"
 #include "platform/linux/files.h"
 #include "platform/linux/paths.h"
+#include "platform/linux/wide_output.h"
 #include "platform/linux/wide_strings.h"
 
 #include <cstdio>
@@ -38,13 +39,13 @@ void updateShutdownLog(const std::wstring& logDir)
 
     const std::wstring path = historyPath(logDir);
     FILE* file = nullptr;
-    open_wfile(file, path.c_str(), L"a+");
+    open_file(file, path.c_str(), L"a+");
     if (file == nullptr) {
         fatalErrorA("QVMRL0098E: Could not open %ls for writing!", path.c_str(), EXIT_PROCESS,
                     WITH_ERRNO);
         return;
     }
-    if (fwprintf(file, L"Started %ls", started.c_str()) < 0 || fflush(file) != 0)
+    if (!putWide(file, L"Started " + started) || fflush(file) != 0)
         fatalErrorA("QVMRL0118E: Error writing to %ls file.", path.c_str(), EXIT_PROCESS,
                     WITH_ERRNO);
     fclose(file);
@@ -64,7 +65,7 @@ static bool copyLinesFrom(int first, FILE* from, FILE* to)
 {
     wchar_t line[LINE_ROOM];
     for (int number = 1; feof(from) == 0 && readFile(from, LINE_FORMAT, line) == 1; ++number) {
-        if (number >= first && fwprintf(to, L"%ls\n", line) < 0)
+        if (number >= first && !putWide(to, std::wstring(line) + L"\n"))
             return false;
     }
     return fflush(to) == 0;
@@ -87,7 +88,7 @@ void truncateShutdownLog(const std::wstring& logDir)
     }
     const std::wstring newPath = path + L".new";
     FILE* kept = nullptr;
-    open_wfile(kept, newPath.c_str(), L"w");
+    open_file(kept, newPath.c_str(), L"w");
     if (kept == nullptr) {
         SvcDebugOutW(L"QVMRL0105E: Unable to open file for writing.\"%s\"", newPath.c_str());
         fclose(history);
