@@ -14,6 +14,8 @@ sys.path.insert(0, str(ROOT / "packaging"))
 
 import catalogue  # noqa: E402
 
+LOGS = pathlib.Path("/mnt/home/VANTOR/RCP/velmora/anna/logs")
+
 
 def test_the_code_the_files_and_the_pages_agree():
     done = subprocess.run([sys.executable, ROOT / "packaging" / "catalogue.py", "--check"], stdout=subprocess.PIPE, text=True)
@@ -149,3 +151,35 @@ def test_every_number_in_a_page_is_one_that_exists():
                 named.setdefault(number, page.name)
     assert {number: page for number, page in named.items() if number not in known} == {}
     assert len(named) > 100
+
+
+def numbers_logged(*words):
+    """The numbers in the logs of a first, a second and a third start."""
+    def story(world):
+        found = set()
+        for number in range(3):
+            # Another level each time makes the last start a provisioning run, with a jvm.properties to be read.
+            if number == 2:
+                pathlib.Path("/mnt/app/rcp/deploy").mkdir()
+                pathlib.Path("/mnt/app/rcp/deploy/jvm.properties").write_text("-Dx=${env.NOTHING,y}\nvmarg.Dshare=-Xs\n")
+                with open("/mnt/app/rcp/velmora.properties", "a") as file:
+                    file.write("provisioning=true\nprovisioning.manifest.version=2\nprovisioning.application=p\n")
+            assert world.run(["velmora", "-velmoraWait", *words]) == (0, "", "")
+            for log in sorted(LOGS.glob("velmora*.log")):
+                found |= set(catalogue.NUMBER.findall(log.read_text()))
+        return found
+    return story
+
+
+def test_what_is_logged_always_and_what_with_debug_only(installation):
+    always, debug = set(), set()
+    for message in catalogue.Catalogue(ROOT)["message"]:
+        (always if message["logged"] == "always" else debug).update(catalogue.NUMBER.findall(message["text"]))
+    plain = installation.isolated(numbers_logged())
+    traced = installation.isolated(numbers_logged("-debug"))
+    assert plain <= always
+    assert plain >= {"QVMRL0030I", "QVMRL0077I", "QVMRL0119I", "QVMRL0125I", "QVMRL0129I", "QVMRL0130I", "QVMRL0132I",
+                     "QVMRL0133I", "QVMRL0303I", "QVMRL0304I", "QVMRL0306I", "QVMRL0090E", "QVMRL0091E"}
+    assert traced - plain <= debug
+    assert traced - plain >= {"QVMRL0023I", "QVMRL0024I", "QVMRL0032I", "QVMRL0071I", "QVMRL0075I", "QVMRL0076I",
+                              "QVMRL0081I", "QVMRL0120I", "QVMRL0126I", "QVMRL0127I"}
