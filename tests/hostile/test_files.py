@@ -1,0 +1,304 @@
+"""Something else where a file is expected: FIFOs, directories, links, and file systems that take nothing."""
+
+import os
+import pathlib
+import re
+
+import pytest
+
+import namespaces
+from world import (APP, BASE, CONFIG, ECLIPSE, HOME, LOCK, LOG, MAIN, PROPERTIES, TEMP_LOG, USER_PROPERTIES,
+                   WORKSPACE, read, state, temp_logs, tree, until, user_logs)
+
+CONFIG_INI = CONFIG + "/config.ini"
+ARGS = CONFIG + "/args.properties"
+UPDATE = CONFIG + "/org.eclipse.update"
+PLATFORM_XML = UPDATE + "/platform.xml"
+HISTORY = WORKSPACE + "/logs/shutdown.log"
+JVM_PROPERTIES = APP + "/rcp/deploy/jvm.properties"
+EXTENSION = APP + "/shared/eclipse/.eclipseextension"
+MARKER = APP + "/rcp/prov.debug/debug.txt"
+SID = WORKSPACE + "/.sid"
+
+# Every file that a start reads, writes or asks for.
+FILES = [PROPERTIES, MARKER, LOCK, SID, LOG, TEMP_LOG, EXTENSION, WORKSPACE + "/applications/eclipse/.eclipseextension",
+         ARGS, CONFIG_INI, BASE + "/config.ini", USER_PROPERTIES, BASE + "/rcpinstall.properties", JVM_PROPERTIES,
+         PLATFORM_XML, BASE + "/platform.xml", HISTORY, MAIN, ECLIPSE]
+
+
+# Only these: a device that never comes to an end is read for ever, as a file would be.
+WRITTEN = [LOG, TEMP_LOG, ARGS, HISTORY, MAIN]
+# It is there, so the start waits until it is gone; see the test of the FIFO.
+STAYS = (MARKER, "directory")
+
+
+def grown(world):
+    """An installation with every file, and a user area in which a platform has run."""
+    world.install()
+    world.jvm_properties("vmarg.a=-Da=1")
+    world.write(EXTENSION, "name=x\n")
+    assert world.run().status == 0
+    world.only_platform()
+    world.all_ended()
+
+
+def replace(path, what):
+    """Puts something else in the place of the file."""
+    os.makedirs(os.path.dirname(path), exist_ok=True)
+    if os.path.lexists(path):
+        os.unlink(path)
+    if what == "fifo":
+        os.mkfifo(path)
+    elif what == "directory":
+        os.mkdir(path)
+        pathlib.Path(path, "inside").write_text("kept\n")
+    elif what == "loop":
+        os.symlink(path, path)
+    elif what == "dangling":
+        os.symlink("/mnt/nowhere/at/all", path)
+    elif what == "null":
+        os.symlink("/dev/null", path)
+    elif what == "full":
+        os.symlink("/dev/full", path)
+
+
+def whole_log():
+    """What all logs hold, held lines and time-stamped ones too."""
+    return "".join(read(path) for path in user_logs() + temp_logs() if os.path.isfile(path))
+
+
+def ends_as_promised(world, start, before=0):
+    """Status 0 or 255; a fatal end has left its line in a log, and has started nothing."""
+    assert start.status in (0, 255)
+    started = len(world.platforms()) - before
+    if start.status == 255:
+        assert any(re.match("QVMRL[0-9]{4}E: ", line) for line in whole_log().splitlines())
+        assert started == 0
+    else:
+        assert started == 1 or "Unable to execute " in whole_log()
+
+
+@pytest.mark.parametrize("path, what", [
+    *((path, what) for path in FILES for what in ("directory", "loop", "dangling", "null") if (path, what) != STAYS),
+    *((path, "full") for path in WRITTEN),
+])
+def test_what_stands_in_the_place_of_a_file(world, path, what):
+    """No crash, no hang, nothing printed; and once the file's place is free again, a start works."""
+    grown(world)
+    replace(path, what)
+    if path == MARKER and what == "null":
+        start = world.start()
+        until(lambda: "QVMRL0303I" in whole_log(), "the log is open")
+        os.unlink(path)
+        start.wait()
+    else:
+        start = world.run()
+    ends_as_promised(world, start, before=1)
+    world.all_ended()
+    if what == "directory" and os.path.isdir(path):
+        assert read(path + "/inside") == "kept\n"
+    if os.path.islink(path):
+        os.unlink(path)
+    elif os.path.isdir(path):
+        os.unlink(path + "/inside")
+        os.rmdir(path)
+    if path == USER_PROPERTIES and what == "null":
+        assert start.status == 255  # an empty copy is believed until somebody removes it
+    if path.startswith(APP):
+        world.install()
+        world.jvm_properties("vmarg.a=-Da=1")
+    before = len(world.platforms())
+    assert world.run().status == 0, whole_log()
+    assert len(world.platforms()) == before + 1
+
+
+# ---- FIFOs: opening one waits for its other end
+
+WAITS = {PROPERTIES, MARKER, SID, TEMP_LOG, EXTENSION, ARGS, CONFIG_INI, USER_PROPERTIES, JVM_PROPERTIES,
+         PLATFORM_XML, HISTORY}
+
+
+def waits_in_open(start):
+    """It sleeps in the kernel's open of a FIFO."""
+    try:
+        with open("/proc/%d/wchan" % start.pid) as file:
+            return file.read() == "wait_for_partner"
+    except FileNotFoundError:
+        return False
+
+
+@pytest.mark.parametrize("path", [path for path in FILES if path != LOCK])
+def test_a_fifo_in_the_place_of_a_file(world, path):
+    """An open that is required waits until somebody opens the other end, and the start goes on then. Where none is
+    required the start just goes on. Never does it hang for another reason."""
+    grown(world)
+    replace(path, "fifo")
+    start = world.start()
+    waited = False
+    opened = []
+    while start.running():
+        if waits_in_open(start):
+            waited = True
+            # The other end: for what it reads there is a writer that has nothing to say, for what it writes a reader.
+            opened.append(os.open(path, os.O_RDWR | os.O_NONBLOCK))
+            until(lambda: not waits_in_open(start), "the open has come back")
+            os.close(opened.pop())
+            if path == MARKER:
+                os.unlink(path)  # while it is there, the start waits for its removal
+    start.wait()
+    assert waited == (path in WAITS)
+    ends_as_promised(world, start, before=1)
+
+
+def test_a_fifo_in_the_place_of_the_lock_file(world):
+    """Reading it waits for somebody who writes; what is written is judged as in a file."""
+    grown(world)
+    replace(LOCK, "fifo")
+    start = world.start()
+    until(lambda: state(start.pid) == "S" and holds_locked(start), "it reads")
+    assert start.running()
+    other = os.open(LOCK, os.O_WRONLY | os.O_NONBLOCK)
+    os.write(other, b"x")
+    os.close(other)
+    assert start.wait().status == 255
+    assert world.temp_log().rstrip("\n").rpartition("\n")[2].startswith(
+        "QVMRL0092E: Error reading platform lock file. : ")
+
+
+def holds_locked(start):
+    with open("/proc/%d/wchan" % start.pid) as file:
+        return "pipe_read" in file.read()
+
+
+# ---- file systems
+
+def test_a_read_only_home(world):
+    """The user's area cannot be made; the line is in /tmp."""
+    world.install()
+    world.small_disk(HOME, 1 << 16)
+    with world.privileged():
+        namespaces.mount("", HOME, source="none", flags=0x20 | 0x1)  # remount, read-only
+    world.fatal(world.run(), "QVMRL0083E: Unable to create %s directory." % WORKSPACE, "No such file or directory")
+    assert tree(HOME) == []
+
+
+def test_a_read_only_user_area(world):
+    """It exists already, but the lock file cannot be opened for writing."""
+    world.install()
+    world.small_disk(HOME, 1 << 20)
+    assert world.run().status == 0
+    world.only_platform()
+    world.all_ended()
+    before = tree(HOME)
+    with world.privileged():
+        namespaces.mount("", HOME, source="none", flags=0x20 | 0x1)
+    start = world.run()
+    assert start.status == 255
+    assert len(world.platforms()) == 1
+    log = world.temp_log().rstrip("\n").splitlines()
+    assert log[-1] == "QVMRL0054E: Error locating platform lock file : Read-only file system"
+    assert "QVMRL0199E: CreateLockFile failed. errno=30" in log
+    assert tree(HOME) == before
+
+
+@pytest.mark.parametrize("inodes", range(2, 26))
+def test_a_file_system_without_room_for_more_files(world, inodes):
+    """At every number of files that still have room: a defined end, its line in a log, and with room a start works."""
+    world.install()
+    world.folder(HOME)
+    with world.privileged():
+        namespaces.mount("tmpfs", HOME, "mode=0755,uid=%d,gid=%d,nr_inodes=%d" % (world.uid, world.uid, inodes))
+    ends_as_promised(world, world.run())
+    world.platforms()
+    world.all_ended()
+    with world.privileged():
+        namespaces.mount("", HOME, "nr_inodes=200", source="none", flags=0x20)
+    before = len(world.platforms())
+    assert world.run().status == 0, whole_log()
+    assert len(world.platforms()) == before + 1
+
+
+@pytest.mark.parametrize("pages", range(1, 12))
+def test_a_file_system_without_room_for_more_bytes(world, pages):
+    """A defined end, with its line in a log that can still be written; the log in the user's area may be cut."""
+    world.install()
+    world.small_disk(HOME, pages * 4096)
+    start = world.run()
+    assert start.status in (0, 255)
+    world.platforms()
+
+
+# ---- what others have put into /tmp
+
+@pytest.mark.needs_root("files of another user")
+@pytest.mark.parametrize("what", ["link", "file", "directory"])
+@pytest.mark.parametrize("ends", ["well", "badly"])
+def test_the_name_of_the_log_in_tmp_is_taken(world, what, ends):
+    """By another user. Neither the start nor its fatal end depends on it; what a link of another one leads to is written
+    only where the system allows to follow it and the user may write there."""
+    world.install()
+    victim = world.write("/mnt/victim", "precious\n")
+    if what == "link":
+        world.link(TEMP_LOG, victim)
+    elif what == "file":
+        world.write(TEMP_LOG, "theirs\n", 0o644)
+    else:
+        world.folder(TEMP_LOG)
+    world.give(TEMP_LOG, 2000)
+    if ends == "badly":
+        world.properties("rcp.install.id=abc")
+    start = world.run()
+    assert start.status == (0 if ends == "well" else 255)
+    follows = pathlib.Path("/proc/sys/fs/protected_symlinks").read_text() == "0\n"
+    if what == "link" and follows and ends == "badly":
+        # The line of the fatal end: what the required open of that name writes.
+        assert read(victim).rstrip("\n").rpartition("\n")[2].startswith("QVMRL0050E: ")
+    else:
+        assert read(victim) == "precious\n"
+    if what == "file":
+        assert read(TEMP_LOG) == "theirs\n"
+    assert os.path.lexists(TEMP_LOG)  # only its owner can remove it from there
+
+
+@pytest.mark.needs_root("files of another user")
+@pytest.mark.parametrize("what", ["link", "file"])
+def test_the_name_of_the_preload_link_is_taken(world, what):
+    """By another user, who thereby keeps the user from the library: LD_PRELOAD names the other one's link, as required,
+    and a plain file there ends every start."""
+    world.install()
+    library = world.write(APP + "/a library/libx.so", "no library\n")
+    world.base_properties("library.preload=" + library)
+    link = "/tmp/vantor.rcp.anna.abc.libx.so"
+    if what == "link":
+        world.link(link, world.write("/mnt/theirs.so", "no library\n"))
+    else:
+        world.write(link, "no library\n")
+    world.give(link, 2000)
+    start = world.run()
+    if what == "file":
+        world.fatal(start, "QVMRL0184E: Getting command path failed! errno = 22", "Invalid argument")
+        return
+    assert start.status == 0
+    assert world.only_platform().env["LD_PRELOAD"] == link
+    assert os.readlink(link) == "/mnt/theirs.so"
+
+
+def test_nothing_else_is_written(world):
+    """Outside the user's area, the fixed names in /tmp and the log: nothing, whatever the start is."""
+    world.install("user", "provisioning=true", "provisioning.manifest.version=1", "provisioning.application=p")
+    world.base_properties("resetDir.a=state", "library.preload=" + world.write(APP + "/a library/libx.so"))
+    outside = {top: (tree(top), {path: read(path) for path in files_below(top)}) for top in (APP, "/mnt")}
+    for words in ([], ["-debug"], ["-resetconfig"], ["-console"], ["-config", "none"]):
+        assert world.run(*words).status == 0
+        world.platforms()
+        world.all_ended()
+    assert sorted(os.listdir("/tmp")) == ["vantor.rcp.anna.abc.libx.so"]
+    assert tree(APP) == outside[APP][0]
+    assert {path: read(path) for path in files_below(APP)} == outside[APP][1]
+    assert sorted(os.listdir("/mnt")) == ["app", "home"]
+    assert os.listdir(HOME) == ["VANTOR"]
+
+
+def files_below(top):
+    return [os.path.join(folder, name) for folder, _, names in os.walk(top) for name in names
+            if not folder.startswith(HOME)]

@@ -1,0 +1,28 @@
+"""A sample of the sweeps, for every check; `run` does all of them.
+
+    VELMORA   the executable, build/native/velmora unless given
+"""
+
+import os
+import pathlib
+import sys
+
+import pytest
+
+sys.dont_write_bytecode = True
+HERE = pathlib.Path(__file__).resolve().parent
+sys.path[:0] = [str(HERE.parent / "launch"), str(HERE)]
+
+import namespaces  # noqa: E402
+from pieces import ROOT, pieces  # noqa: E402
+
+ANNA = 1000
+
+
+@pytest.fixture(scope="session")
+def in_a_world():
+    """Calls a function of (pieces, ...) in a world of its own."""
+    launcher = ROOT / os.environ.get("VELMORA", "build/native/velmora")
+    assert launcher.is_file(), "no launcher at %s; build it, or name it in VELMORA" % launcher
+    built = pieces(launcher)
+    return lambda function, *arguments: namespaces.isolated(lambda: function(built, *arguments), ANNA, 300)

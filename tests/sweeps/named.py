@@ -1,0 +1,131 @@
+"""Which problems the required behaviour itself brings about. Each has its name, its reason and its consequence, which the
+page shows. A case that has any other problem is a failure."""
+
+import re
+
+WORKSPACE = "/mnt/home/VANTOR/RCP/abc/anna/"
+UPDATE = r"\.config/org\.eclipse\.update/"
+NEXT_FATAL = r"next-start:255 QVMRL[0-9]{4}E|missing:\.rcp\.main|short:\.rcp\.lock"
+
+
+class Named:
+    def __init__(self, key, why, consequence, problems, kinds=(), scenarios=(), calls=(), path=None, when=None):
+        self.key, self.why, self.consequence = key, why, consequence
+        self._problems = re.compile("(?:%s)" % problems)
+        self._kinds, self._scenarios, self._calls = kinds, scenarios, calls
+        self._path = re.compile(path) if path is not None else None
+        self._when = when
+
+    def covers(self, kind, case, problem):
+        def among(value, allowed):
+            return not allowed or value in allowed
+
+        path = case.get("path", "").removeprefix(WORKSPACE)
+        return (self._problems.fullmatch(problem) is not None and among(kind, self._kinds)
+                and among(case.get("scenario"), self._scenarios) and among(case.get("call"), self._calls)
+                and (self._path is None or self._path.fullmatch(path) is not None)
+                and (self._when is None or self._when(case)))
+
+
+RENEWING = ("reset", "renewal")
+OPENING = ("open", "openat")
+DISTURBED = ("errors", "kills", "memory")
+
+NAMED = (
+    Named("platform-not-seen",
+          "A lock file that cannot be opened counts as absent, one that cannot be read as empty, and a process test that "
+          "cannot be run as a no.",
+          "A second platform starts in the workspace while the first one runs. It takes a shortage of descriptors or of "
+          "memory, or a broken disk, at that very moment.",
+          "two-platforms", ("errors",), ("daemon",), path=r"\.rcp\.lock|"),
+    Named("number-not-recorded",
+          "A failed write of the platform's number into the lock file is logged (QVMRL0051E), and the start goes on.",
+          "The next start finds no number and starts a second platform while the first one runs.",
+          "two-platforms", ("errors",), calls=("write",), path=r"\.rcp\.lock"),
+    Named("restart-after-twenty-seconds",
+          "A restart waits about 20 seconds for the old platform, then makes its number in the lock file invalid "
+          "(QVMRL0013E) without holding the lock.",
+          "Two platforms run while the old one lives on. Several such restarts within a second wipe out each other's "
+          "numbers too, so that each starts a platform.",
+          r"two-platforms|mains:\d+", ("storms",), when=lambda case: not case["ends"]),
+    Named("user-properties-empty",
+          "When the copy cannot be opened again (QVMRL0074E), the empty new file becomes the user's rcpinstall.properties.",
+          "It is believed for ever: every later start ends with QVMRL0011E, until somebody removes the file.",
+          NEXT_FATAL + r"|short:\.config/rcpinstall\.properties", ("errors",), calls=OPENING,
+          path=r"\.config/rcpinstall\.properties\.(part|new)"),
+    Named("user-properties-empty",
+          "", "", NEXT_FATAL + r"|short:\.config/rcpinstall\.properties", ("memory",),
+          when=lambda case: case["row"] == "QVMRL0011E" and case["asked"].startswith("libc")),
+    Named("user-properties-short",
+          "A failed write into the user's rcpinstall.properties is logged (QVMRL0001E, QVMRL0015E), a failed read counts "
+          "as its end, and the file is put into place all the same.",
+          "What is missing is missing for ever. Depending on the lines, later starts end with a message of their own "
+          "(QVMRL0005E, QVMRL0011E, QVMRL0088E), until somebody removes the file.",
+          NEXT_FATAL + r"|short:\.config/rcpinstall\.properties", ("errors",), calls=("read", "write", "fsync"),
+          path=r"\.config/rcpinstall\.properties\.(part|new)"),
+    Named("user-properties-copy-left",
+          "The results of the removal and the renaming at the end are not looked at.",
+          "The plain copy stays beside the user's rcpinstall.properties. Nothing reads it.",
+          r"left-short:\.config/rcpinstall\.properties\.part", ("errors",), calls=("unlink",),
+          path=r"\.config/rcpinstall\.properties\.part"),
+    Named("platform-xml-short",
+          "A failed write into platform.xml is logged (QVMRL0103E), a failed read of the template counts as its end, and "
+          "the lines so far stay.",
+          "The short platform.xml is believed for ever, until a reset or until somebody removes it.",
+          "short:" + UPDATE + r"platform\.xml", ("errors",), calls=("read", "write", "fsync"),
+          path=r".*/platform\.xml(\.part)?"),
+    Named("words-short-for-now",
+          "args.properties is written in its place, by every start but a restart.",
+          "After a kill at that moment it is short until the next start writes it. A restart in between believes it.",
+          r"short-for-now:\.config/args\.properties", ("kills",), path=r".*/args\.properties|/proc/self/exe"),
+    Named("main-number-short-for-now",
+          "The platform's number is written into .rcp.main in its place.",
+          "After a kill at that moment .rcp.main is empty until the next start. The launcher never reads it.",
+          r"short-for-now:\.rcp\.main", ("kills",), path=r"\.rcp\.main"),
+    Named("extension-mark-short-for-now",
+          "The shared .eclipseextension is copied in its place, by every start.",
+          "After a kill at that moment it is short until the next start copies it.",
+          r"short-for-now:applications/eclipse/\.eclipseextension", ("kills",), path=r".*/\.eclipseextension"),
+    Named("history-line-cut",
+          "The history of starts is appended to, piece by piece.",
+          "One line of shutdown.log is cut short. Nothing but the count of lines depends on it.",
+          r"short:logs/shutdown\.log", DISTURBED),
+    Named("saved-copies-left",
+          "A reset saves the update registry and the bookmarks in the workspace, where they stay when it comes to its "
+          "end before it has put them back.",
+          "registry.old and bookmarks.xml.old stand in the workspace, each whole. A later reset makes them anew; but when "
+          "the registry itself is gone by then, that reset takes a leftover for it. What was being copied ends in .part, "
+          "and is not believed.",
+          r"left:(registry|bookmarks\.xml)\.old|left(-short)?:(registry|bookmarks\.xml)\.old\.part", ("errors", "kills"),
+          RENEWING),
+    Named("registry-not-carried-over",
+          "A reset moves the configuration away before it puts the registry and the bookmarks back, a file that cannot "
+          "be opened counts as absent, and a start without a configuration is a first one.",
+          "The new configuration begins without the update registry and the bookmarks. They are kept in .configbak, and "
+          "as registry.old and bookmarks.xml.old where they were saved.",
+          "missing:" + UPDATE + r"(registry|bookmarks\.xml)|missing:platform\.xml\.old", ("errors", "kills"), RENEWING),
+    Named("older-backup-gone",
+          "The older backup of the configuration is cleared before the configuration takes its place.",
+          "Until the next reset there is no .configbak. The configuration itself is whole.",
+          r"missing:\.configbak(/.*)?", ("errors", "kills"), RENEWING),
+    Named("cleared-backup-left",
+          "What cannot be removed of an old backup that was moved aside is left without a word.",
+          ".configbakdeleteme0001 to 0005 stay until a later reset removes them.",
+          r"left(-short)?:\.configbakdeleteme000[1-5](/.*)?", ("errors", "kills"), RENEWING),
+    Named("log-shared",
+          "velmora.log is begun anew by each launcher, and the last line of each is written after the lock was released.",
+          "The last line of one launcher may stand in the middle of the next one's log, with zero bytes before it.",
+          r"mixed:logs/velmora\.log", ("crowds", "storms")),
+)
+
+
+def judge(kind, case):
+    """Fills in the case's verdict: passed, named (all of its problems are), or failed."""
+    named = set()
+    failed = False
+    for problem in case["problems"]:
+        key = next((entry.key for entry in NAMED if entry.covers(kind, case, problem)), None)
+        failed = failed or key is None
+        named |= {key} - {None}
+    case["named"] = sorted(named)
+    case["verdict"] = "failed" if failed else "named" if named else "passed"

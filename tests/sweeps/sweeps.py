@@ -1,0 +1,144 @@
+"""The sweeps: which calls there are, what is done at each of them, and what came of it.
+
+A call of the launcher is one that comes after main has begun. main begins with opening /dev/null for the standard
+descriptors, which nothing before it does; test_boundary.py holds this. What children do is not looked at, since strace
+does not follow them.
+"""
+
+import re
+
+from lab import TRACE, Lab, hold_still
+from scenarios import SCENARIOS, follow_up, judge_end, prepare, short_for_now
+from world import read
+
+MAIN_BEGINS = re.compile(r'openat\([^,]*, "/dev/null", O_RDWR\)')
+
+# The errors that fit a call; those that are not listed cannot fail with any of them.
+PATH_ERRORS = ["ENOENT", "EACCES", "EIO", "ENOMEM"]
+CHANGE_ERRORS = ["ENOSPC", "EROFS"] + PATH_ERRORS
+ERRORS = {
+    "read": ["EIO", "EINTR"],
+    "write": ["ENOSPC", "EIO", "EINTR"],
+    "close": ["EIO", "EINTR"],
+    "fsync": ["EIO", "ENOSPC", "EINTR"],
+    "lseek": ["EIO"], "_llseek": ["EIO"],
+    "flock": ["EINTR", "EIO", "ENOMEM"],
+    "getdents64": ["EIO", "ENOENT", "ENOMEM"],
+    "wait4": ["EINTR"], "waitpid": ["EINTR"],
+    "clock_nanosleep": ["EINTR"], "clock_nanosleep_time64": ["EINTR"],
+    "getrandom": ["EINTR"],
+    "pipe2": ["EMFILE", "ENOMEM"],
+    "dup": ["EMFILE"], "dup2": ["EMFILE"], "dup3": ["EMFILE"],
+    "mmap": ["ENOMEM", "EACCES"], "mmap2": ["ENOMEM", "EACCES"],
+    "mprotect": ["ENOMEM", "EACCES"], "munmap": ["ENOMEM"], "mremap": ["ENOMEM"], "brk": ["ENOMEM"],
+    "clone": ["ENOMEM"], "clone3": ["ENOMEM"], "fork": ["ENOMEM"], "vfork": ["ENOMEM"],
+    "access": PATH_ERRORS, "faccessat": PATH_ERRORS, "readlink": PATH_ERRORS, "readlinkat": PATH_ERRORS,
+    "stat": PATH_ERRORS, "lstat": PATH_ERRORS, "fstat": ["EIO", "ENOMEM"], "newfstatat": PATH_ERRORS,
+    "stat64": PATH_ERRORS, "lstat64": PATH_ERRORS, "fstat64": ["EIO", "ENOMEM"], "fstatat64": PATH_ERRORS,
+    "statx": PATH_ERRORS,
+    "mkdir": CHANGE_ERRORS, "rmdir": ["EROFS"] + PATH_ERRORS, "unlink": ["EROFS"] + PATH_ERRORS,
+    "rename": CHANGE_ERRORS, "symlink": CHANGE_ERRORS, "chmod": ["EROFS"] + PATH_ERRORS,
+    "fchmod": ["EROFS", "EIO"], "fchmodat": ["EROFS"] + PATH_ERRORS, "ftruncate": ["EIO", "EINTR"],
+}
+OPEN_ERRORS = ["EMFILE", "EINTR"] + PATH_ERRORS
+CREATE_ERRORS = ["ENOSPC", "EROFS"] + OPEN_ERRORS
+
+
+class Call:
+    """The n-th call of this name in the life of the process, the loader's included."""
+
+    def __init__(self, name, number, shown):
+        self.name, self.number, self.shown = name, number, shown
+
+    def errors(self):
+        if self.name in ("open", "openat"):
+            return CREATE_ERRORS if re.search(r"O_WRONLY|O_RDWR|O_CREAT", self.shown) else OPEN_ERRORS
+        return ERRORS.get(self.name, [])
+
+    def path(self):
+        """The first path that it is about, of a descriptor too."""
+        quoted = re.match(r'\w+\((?:AT_FDCWD(?:<[^>]*>)?, )?"([^"]*)"', self.shown)
+        described = re.match(r"\w+\(\d+<([^>]*)>", self.shown)
+        found = quoted or described
+        return found.group(1) if found else ""
+
+    def injection(self, what):
+        if what == "ENOMEM" and self.name == "brk":
+            # The kernel answers a break that cannot be had with the one that is.
+            what = "retval=" + self.before
+        elif what == "KILL":
+            what = "signal=KILL"
+        else:
+            what = "error=" + what
+        return ["-e", "trace=" + self.name, "-e", "signal=none",
+                "-e", "inject=%s:%s:when=%d" % (self.name, what, self.number)]
+
+
+def launcher_calls(text):
+    """The calls of a trace from the beginning of main on, in order."""
+    counts, calls, begun, last_break = {}, [], False, "0"
+    for line in text.splitlines():
+        found = re.match(r"(\w+)\(", line)
+        if not found:
+            continue
+        name = found.group(1)
+        counts[name] = counts.get(name, 0) + 1
+        begun = begun or bool(MAIN_BEGINS.match(line))
+        if begun:
+            call = Call(name, counts[name], line)
+            call.before = last_break
+            calls.append(call)
+        if name == "brk":
+            last_break = line.rpartition("= ")[2].strip()
+    assert begun, "main was not seen to begin"
+    return calls
+
+
+def enter(pieces):
+    hold_still()
+    return Lab(pieces)
+
+
+def list_calls(pieces, name):
+    """In a world: the calls of an undisturbed start."""
+    lab, scenario = enter(pieces), SCENARIOS[name]
+    prepare(lab, scenario)
+    status, said = lab.run(*scenario.words, strace=["-e", "signal=none"])
+    assert (status, said) == (0, "")
+    return launcher_calls(read(TRACE))
+
+
+def disturbed(lab, scenario, call, what):
+    """One disturbed start in a fresh user area: its case, with what is wrong."""
+    lab.reset()
+    status, said = lab.run(*scenario.words, strace=call.injection(what))
+    trace = read(TRACE)
+    case = {"scenario": scenario.name, "call": call.name, "number": call.number, "what": what, "path": call.path(),
+            "status": status, "row": "", "problems": []}
+    if what == "KILL":
+        if status != -9:
+            case["problems"] = ["not-reached"]
+            return case
+        case["problems"] = short_for_now(lab)
+    else:
+        if "(INJECTED" not in trace:
+            case["problems"] = ["not-reached"]
+            return case
+        case["problems"], case["row"] = judge_end(lab, scenario, status, said)
+    case["problems"] = case["problems"] + follow_up(lab, scenario)
+    return case
+
+
+def disturb(pieces, name, jobs):
+    """In a world: the cases of (call, what)."""
+    lab, scenario = enter(pieces), SCENARIOS[name]
+    prepare(lab, scenario)
+    cases = []
+    for call, what in jobs:
+        try:
+            cases.append(disturbed(lab, scenario, call, what))
+        except Exception as trouble:  # what cannot be judged is a failure of that case, not of all
+            lab.end_strangers()
+            cases.append({"scenario": name, "call": call.name, "number": call.number, "what": what,
+                          "path": call.path(), "status": None, "row": "", "problems": ["unjudged:%s" % trouble]})
+    return cases
