@@ -1,5 +1,6 @@
 #include "diag/SvcDebug_linux.h"
 
+#include "diag/narrow.h"
 #include "diag/self_format.h"
 #include "diag/time_stamps.h"
 
@@ -20,45 +21,8 @@ static bool debug = false;
 static std::string logque;
 static FILE* logFILE = nullptr;
 static bool bLineBlock = false;
-static std::wstring debugFilePath;
-static bool bDebugFileExists = false;
 
 char tempOutBuffer[1024];
-
-// The log's own conversion: it must work when everything above it does not. Text that the locale
-// cannot convert is left out.
-static std::string narrow(const wchar_t* text)
-{
-    const size_t length = wcstombs(nullptr, text, 0);
-    if (length == static_cast<size_t>(-1))
-        return std::string();
-    std::string out(length, '\0');
-    wcstombs(&out[0], text, length);
-    return out;
-}
-
-static std::wstring withSlashes(std::wstring path)
-{
-    for (wchar_t& c : path) {
-        if (c == L'\\')
-            c = L'/';
-    }
-    return path;
-}
-
-static std::string narrowPath(const std::wstring& path)
-{
-    return narrow(withSlashes(path).c_str());
-}
-
-static bool fileExists(const char* path)
-{
-    FILE* file = fopen(path, "rbe");
-    if (file == nullptr)
-        return false;
-    fclose(file);
-    return true;
-}
 
 static void writeLine(const char* line)
 {
@@ -228,6 +192,11 @@ static void endProcess(bool exitProcess)
 
 void fatalErrorA(const char* format, const wchar_t* arg, bool exitProcess, bool withErrno)
 {
+    // An argument that the locale cannot convert would end the line where it stands.
+    const int reason = errno;
+    if (wcstombs(nullptr, arg, 0) == static_cast<size_t>(-1))
+        arg = L"";
+    errno = reason;
     std::string line;
     fatalError(withErrno, line, format, arg);
     endProcess(exitProcess);
@@ -320,25 +289,4 @@ void deleteTempLog()
 void getLogLocation(std::wstring& out, const std::wstring& base)
 {
     out = withSlashes(base + L"/logs");
-}
-
-bool debugFileExists(const std::wstring& dir)
-{
-    debugFilePath = dir + L"/rcp/prov.debug/debug.txt";
-    bDebugFileExists = fileExists(narrowPath(debugFilePath).c_str());
-    return bDebugFileExists;
-}
-
-bool debugFileWasFound()
-{
-    return bDebugFileExists;
-}
-
-void waitForDeletionOfDebugFile()
-{
-    if (!bDebugFileExists)
-        return;
-    const std::string path = narrowPath(debugFilePath);
-    while (fileExists(path.c_str()))
-        sleep(1);
 }

@@ -130,15 +130,4 @@ void getLogLocation(std::wstring& out, const std::wstring& base);
 /// Adds lines, each with its line end, to those that are held until the log file opens.
 void addcstr_to_logque(const char* lines);
 
-// ---- The diagnostic marker file ----------------------------------------------------------------
-
-/// Looks for "<dir>/rcp/prov.debug/debug.txt", remembers whether it was there, and says so.
-bool debugFileExists(const std::wstring& dir);
-
-/// What the last debugFileExists of this run found; false when there was none.
-bool debugFileWasFound();
-
-/// When the marker file was found: sleeps, a second at a time, until it is gone. Without a limit.
-void waitForDeletionOfDebugFile();
-
 #endif

@@ -2,22 +2,29 @@
 
 #include <cwchar>
 
-// The length of the complete conversion that begins at `start` (which holds "%"), 0 if there is none.
+// What stands behind a width or precision at `at`: digits, or one "*", or nothing at all.
+static std::wstring::size_type behindNumber(const std::wstring& text, std::wstring::size_type at)
+{
+    if (at >= text.size())
+        return std::wstring::npos;
+    return text[at] == L'*' ? at + 1 : text.find_first_not_of(L"0123456789", at);
+}
+
+// The length of the complete conversion that begins at `start`, which holds "%"; 0 if there is
+// none.
 static std::wstring::size_type conversionLength(const std::wstring& text,
                                                 std::wstring::size_type start)
 {
-    const std::wstring::size_type npos = std::wstring::npos;
     std::wstring::size_type at = text.find_first_not_of(L"-+ #0'", start + 1);
-    if (at != npos)
-        at = text.find_first_not_of(L"0123456789*", at);
-    if (at != npos && text[at] == L'.')
-        at = text.find_first_not_of(L"0123456789*", at + 1);
-    if (at != npos && wcschr(L"hlqLjzt", text[at]) != nullptr && text[at] != L'\0') {
+    at = behindNumber(text, at);
+    if (at < text.size() && text[at] == L'.')
+        at = behindNumber(text, at + 1);
+    if (at < text.size() && wcschr(L"hlqLjzt", text[at]) != nullptr && text[at] != L'\0') {
         const bool doubled =
             (text[at] == L'h' || text[at] == L'l') && text.compare(at + 1, 1, text, at, 1) == 0;
         at += doubled ? 2 : 1;
     }
-    if (at == npos || at >= text.size())
+    if (at >= text.size())
         return 0;
     if (text[at] == L'\0' || wcschr(L"diouxXeEfFgGaAcsCSpnm", text[at]) == nullptr)
         return 0;

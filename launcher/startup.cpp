@@ -1,8 +1,10 @@
 #include "launcher/startup.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "diag/marker_file.h"
 #include "launcher/command/command_assembly.h"
 #include "launcher/command/config_extensions.h"
+#include "launcher/command/initial_run.h"
 #include "launcher/command/jvm_location.h"
 #include "launcher/command/options.h"
 #include "launcher/command/platform_executable.h"
@@ -22,7 +24,6 @@
 #include "platform/linux/paths.h"
 
 #include <cstdlib>
-#include <cwchar>
 
 // The state of the sequence. The raw words are the process's own; the effective ones have the
 // configuration extension merged in, and every later step takes these unless it says "raw".
@@ -237,43 +238,6 @@ static void readJvmProperties(StartupRun& run)
     setJvmLibraryPath(run);
 }
 
-static bool beginsLike(const wchar_t* word, const wchar_t* start)
-{
-    return wcsncmp(word, start, wcslen(start)) == 0;
-}
-
-// The words of an initial configuration run: of the raw ones only the first that begins like each
-// of these survives, the first of them with the word behind it.
-static ArgumentVector initialRunWords(const StartupRun& run)
-{
-    static wchar_t config[] = L"-config";
-    static wchar_t initial[] = L"initial";
-    ArgumentVector words = {run.rawArgv[0], config, initial};
-    bool data = false;
-    bool debug = false;
-    bool console = false;
-    bool noExit = false;
-    for (int i = 1; i < run.rawArgc; ++i) {
-        wchar_t* word = run.rawArgv[i];
-        if (!data && beginsLike(word, L"-data")) {
-            data = true;
-            words.push_back(word);
-            if (i + 1 < run.rawArgc)
-                words.push_back(run.rawArgv[++i]);
-        } else if (!debug && beginsLike(word, L"-debug")) {
-            debug = true;
-            words.push_back(word);
-        } else if (!console && beginsLike(word, L"-console")) {
-            console = true;
-            words.push_back(word);
-        } else if (!noExit && beginsLike(word, L"-noExit")) {
-            noExit = true;
-            words.push_back(word);
-        }
-    }
-    return words;
-}
-
 static void takeInitialRunWords(StartupRun& run)
 {
     if (!isInitialRequired(run.launcherProps, run.userProps))
@@ -281,7 +245,7 @@ static void takeInitialRunWords(StartupRun& run)
     delete[] run.argv;
     run.argv = nullptr;
     run.extension.clear();
-    ArgumentVector words = initialRunWords(run);
+    ArgumentVector words = initialRunWords(run.rawArgc, run.rawArgv);
     mergeExtensions(run, static_cast<int>(words.size()), words.data());
 }
 

@@ -1,6 +1,6 @@
 #include "launcher/command/config_extensions.h"
 
-#include "diag/SvcDebug_linux.h"
+#include "diag/marker_file.h"
 #include "launcher/user_area/locations.h"
 #include "platform/linux/paths.h"
 #include "platform/linux/process.h"
@@ -137,7 +137,8 @@ void addConfigExtentionsToArg(int& newArgc, wchar_t**& newArgv, int argc, wchar_
         insertCargsToVmargMap(vmargs, args);
     }
     newArgc = static_cast<int>(args.size());
-    newArgv = new wchar_t*[args.size()];
+    // With a null at its end: an array of no words at all has a first element, too.
+    newArgv = new wchar_t*[args.size() + 1]();
     for (ArgumentVector::size_type i = 0; i < args.size(); ++i)
         newArgv[i] = args[i];
 }

@@ -15,7 +15,8 @@ void FilterProp(std::wstring& key);
 /// character of code 0 is kept here, and cuts the value where it is read as a C string.
 void FilterValue(std::wstring& value);
 
-/// True for a line that begins with "#" or "!": the rule of copied lines. The reader knows "#" only.
+/// True for a line that begins with "#" or "!": the rule of copied lines. The reader knows "#"
+/// alone.
 bool isComment(const std::wstring& line);
 
 /// True for a line that ends in an odd number of backslashes, its first character not counted.

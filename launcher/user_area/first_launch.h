@@ -9,8 +9,8 @@
 /// createRCPInstallProps, createPlatformXML and checkForProvisioning.
 extern bool userFirstLaunch;
 
-/// Makes `dir` (a path with "/" only) unless it is a directory; making it marks the first launch.
-/// When it cannot be made the process ends with `message`, which holds one %ls for the directory.
+/// Makes `dir` unless it is a directory; making it marks the first launch. When it cannot be made
+/// the process ends with `message`, which holds one %ls for the directory, shown with slashes.
 void makeUserDirectory(const std::wstring& dir, const char* message);
 
 #endif

@@ -43,7 +43,8 @@ static bool fillIn(std::wstring& line, const Feature& feature, const PropertyLis
     }
     const wchar_t* id = findProperty(feature.idKey, props);
     const wchar_t* version = findProperty(feature.versionKey, props);
-    // Decision: a value that holds its own placeholder would be put in for ever; it counts as missing.
+    // Decision: a value that holds its own placeholder would be put in for ever; it counts as
+    // missing.
     if (id != nullptr && version != nullptr &&
         replaceEvery(placeholderOf(feature.idKey), id, line) &&
         replaceEvery(placeholderOf(feature.versionKey), version, line))

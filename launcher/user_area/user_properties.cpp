@@ -52,7 +52,9 @@ std::wstring createRCPInstallProps(const std::wstring& workspaceDir, const std::
     // ends the process and leaves the plain copy in place, so then it is made there.
     std::wstring copy = hasRequiredValues(props) ? placeForNewFile(userPath) : userPath;
     const std::wstring source = getCoreFileLocation(baseLocation, L"rcpinstall.properties");
-    copyFileAside(source.c_str(), copy, userPath.c_str());
+    if (!copyFileAside(source.c_str(), copy, userPath.c_str()))
+        fatalErrorA("QVMRL0022E: Unable to copy rcpinstall.properties to the user directory.",
+                    EXIT_PROCESS, WITH_ERRNO);
     std::wstring newPath = userPath + L".new";
     fixUserRCPInstallProperties(workspaceDir, copy, newPath, rcpHome, props);
     deleteFile(copy.c_str());

@@ -14,10 +14,10 @@ struct ChildStart {
     int execResult; // of execv, in the child; 0 otherwise
 };
 
-/// Starts a child that executes args[0] with `args`, which ends with a null. The parent returns only once
-/// the child has become the new program or has failed to. Error lines, always written: the child
-/// that cannot be executed writes "Unable to execute <path> : <reason>", a launcher that cannot
-/// fork writes "Unable to start <path> : <reason>".
+/// Starts a child that executes args[0] with `args`, which ends with a null. The parent returns
+/// only once the child has become the new program or has failed to. Error lines, always written:
+/// the child that cannot be executed writes "Unable to execute <path> : <reason>", a launcher that
+/// cannot fork writes "Unable to start <path> : <reason>".
 ChildStart startChild(char** args);
 
 /// Waits until the child has ended; its status is not looked at. False when waiting failed.

@@ -95,14 +95,14 @@ static const char* copyText(FILE* in, FILE* out)
     return nullptr;
 }
 
-void copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
+bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
 {
     FILE* in = nullptr;
     open_wfile(in, from, L"r");
     if (in == nullptr) {
         fatalErrorA("QVMRL0190E: Unable to open source file %ls to be copied", from, EXIT_PROCESS,
                     WITH_ERRNO);
-        return;
+        return false;
     }
     FILE* out = openNewFile(place, to, L"w+");
     if (out == nullptr) {
@@ -111,7 +111,7 @@ void copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
         errno = reason;
         fatalErrorA("QVMRL0191E: Unable to open destination file %ls to be copied to", to,
                     EXIT_PROCESS, WITH_ERRNO);
-        return;
+        return false;
     }
     const char* trouble = copyText(in, out);
     if (trouble == nullptr && place != to && !flushToDisk(out))
@@ -120,18 +120,18 @@ void copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
     fclose(in);
     fclose(out);
     if (trouble == nullptr)
-        return;
+        return true;
     if (place != to)
         deleteFile(place.c_str());
     errno = reason;
     fatalErrorA(trouble, EXIT_PROCESS, WITH_ERRNO);
+    return false;
 }
 
 bool copyFile(const wchar_t* from, const wchar_t* to)
 {
     std::wstring place = to;
-    copyFileAside(from, place, to);
-    return true;
+    return copyFileAside(from, place, to);
 }
 
 // Decision: a file that is believed for ever once it stands is written aside and renamed, so that
@@ -167,12 +167,11 @@ bool publishNewFile(const std::wstring& place, const std::wstring& target)
 bool copyNewFile(const wchar_t* from, const wchar_t* to)
 {
     std::wstring place = placeForNewFile(to);
-    copyFileAside(from, place, to);
-    return publishNewFile(place, to);
+    return copyFileAside(from, place, to) && publishNewFile(place, to);
 }
 
-// A buffer for a stream that is closed again by the function that opens it; at most two of these are
-// open at a time. Without one of its own a stream asks for the file's block size first.
+// A buffer for a stream that is closed again by the function that opens it; at most two of these
+// are open at a time. Without one of its own a stream asks for the file's block size first.
 static void giveBuffer(FILE* fp)
 {
     static char buffers[4][4096];

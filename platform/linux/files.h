@@ -49,8 +49,9 @@ FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mod
 /// Puts what was written, flushed and closed at `place` to `target`. True on success.
 bool publishNewFile(const std::wstring& place, const std::wstring& target);
 
-/// copyFile to `place`, flushed to the disk when that is not `to`; messages name `to`.
-void copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to);
+/// copyFile to `place`, flushed to the disk when that is not `to`; messages name `to`. Always
+/// returns true.
+bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to);
 
 /// copyFile for such a file. Fatal: as copyFile, with nothing left behind. False when the whole
 /// copy could not be given its name.

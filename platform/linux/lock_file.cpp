@@ -5,19 +5,15 @@
 #include "platform/linux/argument_vector.h"
 #include "platform/linux/files.h"
 #include "platform/linux/paths.h"
+#include "platform/linux/platform_process.h"
 #include "platform/linux/process.h"
 #include "platform/linux/wide_strings.h"
 
 #include <cerrno>
-#include <climits>
-#include <csignal>
 #include <cstdio>
-#include <cstdlib>
 #include <cwchar>
-#include <cwctype>
 #include <fcntl.h>
 #include <sys/file.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 static FILE* lockFILE = nullptr;
@@ -184,57 +180,6 @@ void populateMainPidFile(unsigned long mainPid)
     fclose(file);
 }
 
-static bool isPlainNameCharacter(wchar_t c)
-{
-    return (c < 128 && iswalnum(static_cast<wint_t>(c)) != 0) || wcschr(L"._-+/", c) != nullptr;
-}
-
-// `name` as one word of the shell.
-static std::string shellWord(const std::wstring& name)
-{
-    bool plain = true;
-    std::wstring quoted = L"'";
-    for (const wchar_t c : name) {
-        plain = plain && isPlainNameCharacter(c);
-        if (c == L'\'')
-            quoted += L"'\\''";
-        else
-            quoted += c;
-    }
-    std::string word;
-    wcstochar(word, plain ? name.c_str() : (quoted + L"'").c_str());
-    return word;
-}
-
-// Decision: the command has room for 99 bytes; a name that is too long is cut, and still found by
-// what is left of it. A name with characters that mean something to the shell is quoted: it is a
-// pattern for grep, never a command.
-static std::string platformTest(std::wstring exeName)
-{
-    static const size_t LONGEST_COMMAND = 99;
-    const std::string start = "ps h " + std::to_string(pid) + " | grep ";
-    const std::string end = " 2>&1 1>/dev/null";
-    std::string name = shellWord(exeName);
-    while (start.size() + name.size() + end.size() > LONGEST_COMMAND && !exeName.empty()) {
-        exeName.pop_back();
-        name = shellWord(exeName);
-    }
-    return start + name + end;
-}
-
-// True when the process `pid` lives and is the platform.
-static bool isPlatformProcess(const std::wstring& exeName)
-{
-    // A number that no process can have is a dead one, also where pid_t is narrower than long.
-    if (pid > INT_MAX || pid < -INT_MAX)
-        return false;
-    if (kill(static_cast<pid_t>(pid), 0) != 0 && errno == ESRCH)
-        return false;
-    // The shell is required here: packages depend on ps.
-    const int status = system(platformTest(exeName).c_str());
-    return status != -1 && WIFEXITED(status) && WEXITSTATUS(status) == 0;
-}
-
 bool isMainProcessRunning(const std::wstring& exeName)
 {
     if (!exists(lockFilePath.c_str()))
@@ -250,7 +195,7 @@ bool isMainProcessRunning(const std::wstring& exeName)
         SvcDebugOutA("QVMRL0091E: No data in the platform lock file.");
         return false;
     case 1:
-        return isPlatformProcess(exeName);
+        return isPlatformAlive(pid, exeName);
     default:
         fatalErrorA("QVMRL0092E: Error reading platform lock file.", EXIT_PROCESS, WITH_ERRNO);
         return false;

@@ -1,4 +1,5 @@
 #include "diag/SvcDebug_linux.h"
+#include "diag/marker_file.h"
 
 #include "tests/unit/separate_process.h"
 #include "tests/unit/support.h"

@@ -1,6 +1,7 @@
 #include "launcher/command/config_extensions.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "diag/marker_file.h"
 #include "tests/unit/fixtures.h"
 
 #include <cerrno>

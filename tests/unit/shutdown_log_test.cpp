@@ -185,7 +185,7 @@ TEST(truncateShutdownLog, LogsWhenTheDiskIsFull)
     TempDir dir;
     dir.write("shutdown.log", history(1, 200));
     ASSERT_EQ(symlink("/dev/full", dir.path("shutdown.log.new").c_str()), 0);
-    EXPECT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
+    ASSERT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
               "QVMRL0137E: Error while truncating file.\"" + dir.path("shutdown.log") + "\"\n");
     EXPECT_EQ(dir.read("shutdown.log"), history(1, 200));
 }
@@ -199,7 +199,7 @@ TEST(truncateShutdownLog, LogsWhenAWriteFailsBeforeTheEnd)
         lines += std::string(1000, 'x') + "\n";
     dir.write("shutdown.log", lines);
     ASSERT_EQ(symlink("/dev/full", dir.path("shutdown.log.new").c_str()), 0);
-    EXPECT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
+    ASSERT_EQ(logOf(false, [&] { truncateShutdownLog(dir.wdir); }),
               "QVMRL0137E: Error while truncating file.\"" + dir.path("shutdown.log") + "\"\n");
     EXPECT_EQ(dir.read("shutdown.log"), lines);
 }

@@ -598,3 +598,24 @@ TEST(resetMetaDataDirs, EndsWithTheListOfWhatCouldNotBeRemoved)
     EXPECT_EQ(ended.log.substr(0, text.size()), text);
     EXPECT_TRUE(area.dir.has("ws/.metadata/.plugins/two"));
 }
+
+TEST(handleCopy, DecisionACopyAppearsWholeUnderItsName)
+{
+    const TempDir dir;
+    // A directory at the place aside: the copy falls back to the straight way, and is whole.
+    dir.write("src", "text\n");
+    dir.makeDir("dst.part");
+    EXPECT_TRUE(copied(dir, L"dst", L"src"));
+    EXPECT_EQ(dir.read("dst"), "text\n");
+    EXPECT_TRUE(dir.has("dst.part"));
+}
+
+TEST(handleCopy, DecisionACopyThatCannotBeFinishedLeavesNothingUnderItsName)
+{
+    const TempDir dir;
+    dir.write("src", "begun \xff not decodable\n");
+    EXPECT_FATAL(handleCopy(dir.wdir, L"dst", dir.wdir, L"src", false, false),
+                 "QVMRL0193E: Did not encounter EOF while copying file contents");
+    EXPECT_FALSE(dir.has("dst"));
+    EXPECT_FALSE(dir.has("dst.part"));
+}

@@ -1,0 +1,20 @@
+// The log's own conversion to bytes, and its own look at files: they must work when everything
+// above does not.
+#ifndef DIAG_NARROW_H
+#define DIAG_NARROW_H
+
+#include <string>
+
+/// The text in the locale's encoding; empty when the locale cannot convert it.
+std::string narrow(const wchar_t* text);
+
+/// The path with every backslash turned into a slash.
+std::wstring withSlashes(std::wstring path);
+
+/// The path as this system takes it, with slashes, in bytes.
+std::string narrowPath(const std::wstring& path);
+
+/// True when the file can be opened for reading.
+bool fileExists(const char* path);
+
+#endif
