@@ -113,3 +113,35 @@ def test_links_between_the_pages_lead_somewhere():
     for page in blocks.pages():
         for target in re.findall(r"\]\(([^)#:]+)\)", page.read_text()):
             assert (page.parent / target).exists(), "%s: %s" % (page.name, target)
+
+
+def kiosk_examples():
+    page = (ROOT / "packaging" / "man" / "velmora-kiosk.7").read_text()
+    return [text.strip().replace("\\-", "-").replace("\\&", "") + "\n"
+            for text in re.findall(r"^\.nf\n(.*?)^\.fi\n", page, re.M | re.S)]
+
+
+def only(texts, piece):
+    found = [text for text in texts if piece in text]
+    assert len(found) == 1, piece
+    return found[0]
+
+
+def test_the_session_library_of_the_manual_is_one(tmp_path):
+    (tmp_path / "lockdown.c").write_text(only(kiosk_examples(), "bool logoff(void)"))
+    command = only(kiosk_examples(), "cc ").strip()
+    done = subprocess.run(command, shell=True, cwd=tmp_path, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
+    assert (done.returncode, done.stdout) == (0, "")
+    exported = subprocess.run(["nm", "-D", "--defined-only", "lockdown.so"], cwd=tmp_path, stdout=subprocess.PIPE, text=True)
+    assert re.search(r" T logoff$", exported.stdout, re.M)
+
+
+def test_the_script_of_the_manual_hands_the_words_on_and_pauses(tmp_path):
+    script = only(kiosk_examples(), "sleep 5")
+    assert script.startswith("#!/bin/sh\n") and script.endswith("\nsleep 5\n")
+    (tmp_path / "kiosk-eclipse").write_text(script.replace("sleep 5", "echo pause"))
+    (tmp_path / "eclipse").write_text('#!/bin/sh\nprintf "<%s>" "$@"\n')
+    for name in ("kiosk-eclipse", "eclipse"):
+        (tmp_path / name).chmod(0o755)
+    done = subprocess.run([tmp_path / "kiosk-eclipse", "-data", "a b"], stdout=subprocess.PIPE, text=True)
+    assert (done.returncode, done.stdout) == (0, "<-data><a b>pause\n")
