@@ -239,3 +239,28 @@ TEST(doShutdownLogUpdate, EndsWithoutALogDirectory)
         [&] { doShutdownLogUpdate(dir.wdir); },
         "QVMRL0098E: Could not open " + dir.path("logs/shutdown.log") + " for writing!", ENOENT));
 }
+
+TEST(truncateShutdownLog, KeepsNoStreamOpenWhenTheNewFileCannotBeOpened)
+{
+    TempDir dir;
+    dir.write("shutdown.log", history(1, 200));
+    dir.makeDir("shutdown.log.new");
+    logOf(false, [&] {
+        const int before = dup(0);
+        close(before);
+        truncateShutdownLog(dir.wdir);
+        const int after = dup(0);
+        close(after);
+        EXPECT_EQ(after, before);
+    });
+}
+
+TEST(truncateShutdownLog, APieceThatEndsInsideACharacterIsABlankLine)
+{
+    TempDir dir;
+    // The 2024th byte of the line is the first of the two of an e with an accent.
+    dir.write("shutdown.log", history(1, 199) + std::string(2023, 'x') + "\xc3\xa9tail\n");
+    truncateShutdownLog(dir.wdir);
+    // 201 lines: the last 101 begin with line 101, and the last two cannot be converted.
+    EXPECT_EQ(dir.read("shutdown.log"), history(101, 199) + "\n\n");
+}
