@@ -170,11 +170,18 @@ static const char* const CAPTURED = "QVMRL0303I: lock file captured @ TIME\n";
 static const char* const WE_ARE_MAIN = "QVMRL0304I: We are main process\n";
 static const char* const WE_ARE_DAEMON = "QVMRL0305I: We are daemon process\n";
 
-// The lines of `action` alone, without those that are held from before.
+// The lines of `action` alone, without those that are held from before. The log's directory is gone
+// afterwards, also in a child that ends by _exit.
 static std::string linesOf(bool tracing, const std::function<void()>& action)
 {
-    logOf(false, [] {});
-    return logOf(tracing, action);
+    const TempDir dir;
+    setDebug(false);
+    enableLogging(dir.wdir);
+    const size_t held = dir.read("velmora.log").size();
+    setDebug(tracing);
+    action();
+    setDebug(false);
+    return dir.read("velmora.log").substr(held);
 }
 
 TEST(locateLockFile, FirstStartMakesTheFileAndIsMain)
