@@ -795,3 +795,13 @@ TEST(waitForDeletionOfDebugFile, SleepsUntilTheMarkerIsGone)
     fs::remove(dir.path("rcp/prov.debug/debug.txt"));
     EXPECT_EQ(statusOf(child), 0);
 }
+
+TEST(fatalErrorA, KeepsItsWordsAroundAnArgumentThatTheLocaleCannotConvert)
+{
+    EXPECT_TRUE(endsWith(
+        [] {
+            errno = ENOENT;
+            fatalErrorA("Unable to create %ls directory.", L"\xd800", EXIT_PROCESS, WITH_ERRNO);
+        },
+        "Unable to create  directory.", ENOENT));
+}

@@ -3,6 +3,7 @@
 #include "tests/unit/fixtures.h"
 
 #include <algorithm>
+#include <clocale>
 #include <filesystem>
 
 namespace fs = std::filesystem;
@@ -229,4 +230,36 @@ TEST(doCacheMaintenance, AFailureLeavesRemovedFalseWithoutAMessage)
     EXPECT_FALSE(ws.maintain(ws.vmargs(L"app", L"ws/cache")));
     EXPECT_EQ(ws.names("ws/cache"), (Names{"ap", "app_dir", "link", "other"}));
     EXPECT_EQ(ws.starts(), 2);
+}
+
+TEST(doCacheMaintenance, LeavesADirectoryAloneWhoseTextHoldsTheWorkspaceFurtherOn)
+{
+    const Workspace ws;
+    // "<dir>/x<dir>/ws/cache" holds the workspace's whole text, and does not begin with it.
+    const std::string foreign = "x" + ws.dir.path("ws/cache");
+    ws.dir.write(foreign + "/app_1", "");
+    VmargMap map = ws.vmargs(L"app", L"ws/cache");
+    const std::wstring place = ws.dir.wide(foreign);
+    map[L"vmarg.Dshare"] = L"name=app,controlDir=" + place;
+    EXPECT_FALSE(ws.maintain(map));
+    EXPECT_TRUE(ws.dir.has(foreign + "/app_1"));
+    EXPECT_EQ(ws.starts(), 1);
+}
+
+TEST(doCacheMaintenance, TrimsTheNameBeforeItIsCutAtThePerCentSign)
+{
+    const Workspace ws;
+    ws.dir.write("ws/cache/app 1", "");
+    EXPECT_TRUE(ws.maintain(ws.vmargs(L" app %u ", L"ws/cache")));
+    EXPECT_FALSE(ws.dir.has("ws/cache/app 1"));
+    EXPECT_TRUE(ws.dir.has("ws/cache/app_1"));
+}
+
+TEST(doCacheMaintenance, DecisionANameThatTheLocaleCannotConvertMatchesNothing)
+{
+    const Workspace ws;
+    ASSERT_NE(setlocale(LC_CTYPE, "C"), nullptr);
+    EXPECT_FALSE(ws.maintain(ws.vmargs(L"\u00e9cole", L"ws/cache")));
+    EXPECT_EQ(ws.names("ws/cache"), ALL);
+    EXPECT_EQ(ws.starts(), 1);
 }

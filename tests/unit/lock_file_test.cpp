@@ -847,3 +847,83 @@ TEST(roles, FixedAnswers)
     EXPECT_FALSE(isPipeDaemonCommand());
     getCmdString();
 }
+
+// What the process writes to standard output and standard error during `action`.
+static std::string outputOf(const std::function<void()>& action)
+{
+    TempDir dir;
+    const std::string path = dir.path("output");
+    statusOf([&] {
+        const int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+        if (fd < 0 || dup2(fd, 1) != 1 || dup2(fd, 2) != 2)
+            abort();
+        action();
+        _exit(0);
+    });
+    return dir.read("output");
+}
+
+TEST(isMainProcessRunning, NothingIsPrintedForWhatCannotBeFound)
+{
+    Platform platform;
+    EXPECT_EQ(outputOf([] { EXPECT_EQ(roleWith("0"), MAIN); }), "");
+    EXPECT_EQ(outputOf([] { EXPECT_EQ(roleWith("-1"), MAIN); }), "");
+    EXPECT_EQ(outputOf([&] { EXPECT_EQ(roleWith(platform.number(), L""), MAIN); }), "");
+    EXPECT_EQ(roleWith("0"), MAIN);
+    EXPECT_EQ(roleWith(platform.number(), L""), MAIN);
+}
+
+TEST(isMainProcessRunning, DecisionANameThatBeginsWithADashIsAPatternAndNoOption)
+{
+    Platform platform;
+    EXPECT_EQ(roleWith(platform.number(), L"-V"), MAIN);
+    EXPECT_EQ(roleWith(platform.number(), L"-platform"), DAEMON);
+}
+
+TEST(isMainProcessRunning, NameOutsideAscii)
+{
+    Platform platform("\xc3\xa9"
+                      "clipse");
+    EXPECT_TRUE(finds(platform, L"\u00e9clipse"));
+    EXPECT_FALSE(finds(platform, L"\u00e8clipse"));
+}
+
+TEST(restartWait, OldNumberIsDecimalWhateverItBeginsWith)
+{
+    Platform old("fake-platform", 2);
+    TempDir dir;
+    dir.write(".rcp.lock", old.number());
+    locate(dir.wdir, restartOf("0" + old.number()));
+    // Read as another number it would not be the old platform's, and this a daemon at once.
+    EXPECT_TRUE(isMainProcess());
+}
+
+TEST(lockLockFile, MarkerIsFoundInAWorkspaceWithBackslashes)
+{
+    TempDir dir;
+    dir.write("ws/.sid", "");
+    locate(dir.wdir + L"\\ws");
+    EXPECT_TRUE(isDirtyShutdown());
+    EXPECT_FALSE(dir.has("ws/.sid"));
+}
+
+TEST(populateLockFile, RecordsTheNumberInItsOwnFileFirst)
+{
+    TempDir dir;
+    locate(dir.wdir);
+    dir.makeDir(".rcp.main");
+    fillDiskOf(dir);
+    EXPECT_EQ(linesOf(false, [] { populateLockFile(1234); }),
+              "QVMRL00XXI: Unable to open rcp.main file\n"
+              "QVMRL0051E: Unable to write to platform lock file\n");
+}
+
+TEST(getPipeName, NameOutsideAscii)
+{
+    TempDir dir;
+    dir.write(".pipe", "\xc3\xa9\xe2\x82\xac\n");
+    locate(dir.wdir);
+    std::wstring name;
+    EXPECT_TRUE(getPipeName(name));
+    EXPECT_EQ(name, L"\u00e9\u20ac");
+}

@@ -63,3 +63,10 @@ TEST(formatOfItself, TakesAZeroAsAnyOtherCharacter)
     EXPECT_EQ(formatOfItself(std::wstring(L"a%\0d", 4)), std::wstring(L"a%\0d", 4));
     EXPECT_EQ(formatOfItself(std::wstring(L"a\0%d", 4)), std::wstring(L"a\0", 2));
 }
+
+TEST(formatOfItself, TwoStarsAreNoWidth)
+{
+    EXPECT_EQ(formatOfItself(std::wstring(L"%**d")), L"%**d");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%5*d")), L"%5*d");
+    EXPECT_EQ(formatOfItself(std::wstring(L"%.*5d")), L"%.*5d");
+}
