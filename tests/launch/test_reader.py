@@ -99,6 +99,15 @@ def test_a_continued_x_line(world):
     assert world.only_platform().argv == HEAD + areas() + STARTUP + system() + INSTALL_AREA + ["-Xa:b"]
 
 
+def test_a_line_of_one_character_leaves_the_mark_of_the_line_before(world):
+    """A lone backslash begins a property that goes on; its separator is kept, as on the "-X" line before it."""
+    world.install()
+    world.jvm_properties("-Xa", "\\", "-Db=2", "\\", "-Dc=3")
+    world.run()
+    assert world.only_platform().argv == (
+        HEAD + areas() + STARTUP + system() + ["-Db==2", "-Dc==3"] + INSTALL_AREA + ["-Xa"])
+
+
 def test_the_last_line_needs_no_end(world):
     world.install()
     world.write(JVM_FILE, "-Da=1\n-Db=2")
