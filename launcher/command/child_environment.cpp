@@ -109,6 +109,7 @@ static void clearPreloadLink(const std::wstring& linkPath, const std::wstring& l
     if (target == library)
         return;
     SvcDebugOutA("setPreload(): removing existing link ...");
+    // Decision: one that cannot be removed, being another user's, stays and is named.
     deleteFile(linkPath.c_str());
 }
 

@@ -25,7 +25,8 @@ void addEnvJavaHighZipfds(const PropertyList& props);
 
 /// LD_PRELOAD becomes `preloadPath`. It cannot hold a blank, so a path with one is reached through
 /// the link "/tmp/vantor.rcp.<user>.<install id>.<library name>", which is made, or replaced when
-/// it leads elsewhere; a library that does not exist sets nothing. Traces every step.
+/// it leads elsewhere; a library with a blank that does not exist sets nothing, one without is not
+/// looked at. A link that cannot be made or replaced is named all the same. Traces every step.
 /// Fatal: QVMRL0189E (no "/" in the path), "QVMRL0006E: Couldn't find the user name!", QVMRL0184E.
 void setPreload(const std::wstring& preloadPath, const std::wstring& installId);
 

@@ -10,8 +10,10 @@
 
 /// Merges the chosen extension into the arguments: sets `newArgv` to a new array of `newArgc`
 /// words (released with delete[]; the words stay with argv and the list), and `args` to the same
-/// words. "vmarg." words go into the map. "-data" replaces "rcp.data" in `launcherProps`. Without
-/// an extension the diagnostic marker file below `rcpHome` is looked for, and adds its words.
+/// words. "vmarg." words go into the map. With an extension, the second occurrence of each option
+/// that must not stand twice is removed, and "-data" replaces "rcp.data" in `launcherProps`; the
+/// words of the diagnostic marker file are added when an earlier call of this run found it. Without
+/// an extension that file is looked for below `rcpHome`.
 /// Fatal: QVMRL0033E, QVMRL0128E ("vmarg." without "=").
 void addConfigExtentionsToArg(int& newArgc, wchar_t**& newArgv, int argc, wchar_t** argv,
                               PropertyList& launcherProps, ArgumentVector& args, VmargMap& vmargs,

@@ -161,7 +161,12 @@ FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mod
 
 bool publishNewFile(const std::wstring& place, const std::wstring& target)
 {
-    return place == target || moveFile(place.c_str(), target.c_str());
+    if (place == target || moveFile(place.c_str(), target.c_str()))
+        return true;
+    const int reason = errno;
+    deleteFile(place.c_str());
+    errno = reason;
+    return false;
 }
 
 bool copyNewFile(const wchar_t* from, const wchar_t* to)
