@@ -190,7 +190,13 @@ bool isMainProcessRunning(const std::wstring& exeName)
     // the buffer is dropped first; otherwise a restart would wait for the old number for ever.
     fflush(lockFILE);
     rewind(lockFILE);
-    switch (fscanf(lockFILE, "%ld", &pid)) {
+    const int numbers = fscanf(lockFILE, "%ld", &pid);
+    const int reason = errno;
+    // What is left in the buffer goes at once: a child that ends as a launcher would set the shared
+    // position of the file back by that much, in the middle of a later write of ours.
+    fflush(lockFILE);
+    errno = reason;
+    switch (numbers) {
     case EOF:
         SvcDebugOutA("QVMRL0091E: No data in the platform lock file.");
         return false;

@@ -38,7 +38,11 @@ bool logoff()
 bool shutdown()
 {
     umask(0);
-    const int fd = open(CMD_FILE, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+    // One that stands there is opened as it is: some systems refuse to create what another user has
+    // created in /tmp, though everybody may write to it.
+    int fd = open(CMD_FILE, O_WRONLY | O_TRUNC | O_CLOEXEC);
+    if (fd < 0)
+        fd = open(CMD_FILE, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
     if (fd < 0)
         return false;
     // "shutdown" and its zero at offset 0, "1" and its zero at offset 256, zeros elsewhere.

@@ -927,3 +927,18 @@ TEST(getPipeName, NameOutsideAscii)
     EXPECT_TRUE(getPipeName(name));
     EXPECT_EQ(name, L"\u00e9\u20ac");
 }
+
+TEST(isMainProcessRunning, LeavesNothingThatAChildCouldSetBack)
+{
+    TempDir dir;
+    dir.write(".rcp.lock", "4194303          ");
+    locate(dir.wdir);
+    const int fd = descriptorOf(dir.path(".rcp.lock"));
+    ASSERT_GE(fd, 0);
+    const off_t before = lseek(fd, 0, SEEK_CUR);
+    // A child that ends as a launcher does flushes the streams that it has inherited.
+    EXPECT_EQ(statusOf([] { exit(0); }), 0);
+    EXPECT_EQ(lseek(fd, 0, SEEK_CUR), before);
+    populateLockFile(1234);
+    EXPECT_EQ(dir.read(".rcp.lock"), "1234             ");
+}
