@@ -177,6 +177,14 @@ def test_the_base_location_must_be_given(world):
     assert tree(HOME) == []
 
 
+def test_the_install_id_is_asked_for_before_the_base_location(world):
+    """Neither is there."""
+    world.install()
+    world.properties("install.configuration=user")
+    world.fatal(world.run(), "QVMRL0016E: rcp.install.id is required for this configuration!")
+    assert tree(HOME) == []
+
+
 # ---- config.ini
 
 def test_config_ini_is_copied_byte_for_byte(world):
@@ -327,11 +335,13 @@ def test_without_a_shared_extension_the_link_of_the_area_stays(world):
 
 
 def test_a_shared_extension_link_that_cannot_be_copied(world):
+    """The start ends before it records its words."""
     world.install()
     world.write(APP + "/shared/eclipse/.eclipseextension", "x\n")
     world.folder(EXTENSIONS + "/.eclipseextension")
     world.fatal(world.run(), "QVMRL0191E: Unable to open destination file %s/.eclipseextension to be copied to"
                 % EXTENSIONS, "Is a directory")
+    assert tree(CONFIG) == []
 
 
 def test_the_steps_come_in_a_fixed_order(world):

@@ -166,6 +166,29 @@ def test_a_platform_that_the_system_cannot_start(world):
     assert start.seconds < 5
 
 
+def failed_children():
+    """The exit statuses of the processes that have said that they could not be executed. The tracer saw them."""
+    said, statuses = set(), []
+    for line in read("/dev/shm/strace").splitlines():
+        pid, _, call = line.partition(" ")
+        call = call.strip()
+        if call.startswith("write(") and '"Unable to execute ' in call:
+            said.add(pid)
+        if call.startswith("exit_group(") and pid in said:
+            statuses.append(int(call[len("exit_group("):].partition(")")[0]))
+    return statuses
+
+
+@pytest.mark.parametrize("words", [[], ["-velmoraWait"]])
+def test_the_status_of_a_child_that_could_not_be_executed(world, words):
+    """It goes on as a launcher that has nothing to do."""
+    world.install()
+    world.write(ECLIPSE, "no program", 0o755)
+    assert world.run(*words, strace=["-s", "100", "-e", "trace=write,exit_group"]).status == 0
+    world.all_ended()
+    assert failed_children() == [0]
+
+
 def test_after_a_failed_start_the_next_one_is_main(world):
     world.install()
     world.write(ECLIPSE, "no program", 0o755)

@@ -2,7 +2,7 @@
 
 import pytest
 
-from world import APP, HEAD, INSTALL_AREA, STARTUP, areas, system
+from world import APP, HEAD, INSTALL_AREA, STARTUP, areas, read, system, user_logs
 
 NOT_FOUND = ('QVMRL0125I: No jvm.properties file was loaded. A default file should be at "${rcp.home}/rcp/deploy"\n')
 SHOWN = ["-Dhome=${prop.java.home}", "-Droot=${prop.jvm.root}"]
@@ -161,6 +161,16 @@ def test_a_home_that_is_given_is_kept(world):
     world.jvm_properties(*SHOWN, "java.home=/mnt/mine")
     world.run()
     assert shown(world) == ["-Dhome=/mnt/mine", "-Droot=/mnt/app/rcp/deploy/"]
+
+
+def test_a_home_that_is_given_is_not_even_computed(world):
+    """The trace would show the pair that is added."""
+    world.install()
+    world.jvm_properties("java.home=/mnt/mine")
+    world.run("-debug")
+    log = read(user_logs()[0])
+    assert 'QVMRL0126I:   key = "jvm.root"\n' in log
+    assert 'QVMRL0126I:   key = "java.home"\n' not in log
 
 
 def test_a_root_that_is_given_is_kept(world):

@@ -128,6 +128,14 @@ def test_the_word_counts_after_vmargs_too(world):
     assert "QVMRL0023I:   attrib = \"rcp.install.id\"\n" in read(user_logs()[0])
 
 
+def test_an_extension_may_turn_tracing_off_again(world):
+    """The words decide once they are merged: a restart is not traced."""
+    world.install("user", "config.a.1=-restart")
+    assert world.run("-debug", "-config", "a").status == 0
+    assert user_logs() == [LOG]
+    assert temp_logs() == []
+
+
 def test_the_missing_configuration_is_told_only_in_the_trace(world):
     """Then it is the one for a user."""
     world.install(None)
@@ -213,6 +221,19 @@ def test_a_log_that_cannot_be_opened_ends_the_start(world, in_the_way, reason):
     assert (start.status, world.platforms()) == (255, [])
     assert untimed(read(TEMP_LOG)) == ORDINARY[:ORDINARY.index("\n\nQVMRL0119I")] + lines(
         "", "QVMRL0019E: Could not open %s for writing! : %s" % (LOG, reason), "")
+    assert not os.path.exists(CONFIG)
+
+
+def test_a_traced_log_that_cannot_be_opened_ends_the_start(world):
+    """The held lines get a file of their own in /tmp."""
+    world.install()
+    world.folder(os.path.dirname(LOG), 0o555)
+    start = world.run("-debug")
+    assert (start.status, world.platforms()) == (255, [])
+    (saved,) = temp_logs()
+    assert TRACED.fullmatch(os.path.basename(saved))
+    assert untimed(read(saved)).splitlines()[-2:] == [
+        "QVMRL0019E: Could not open %s/logs/velmora_<time>.log for writing! : Permission denied" % WORKSPACE, ""]
     assert not os.path.exists(CONFIG)
 
 

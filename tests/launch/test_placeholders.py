@@ -25,6 +25,14 @@ def test_standard_ones_are_replaced_everywhere(world):
         "-Da=/mnt/app:%s:%s:/mnt/app" % (WORKSPACE, WORKSPACE)]
 
 
+def test_the_users_properties_then_the_recorded_words_then_those_of_the_jvm(world):
+    """The first of equal keys counts: the user's before the record's, the record's before the JVM's. One word and the
+    program make two."""
+    world.jvm_properties("arg1=third", "argc=third")
+    assert shown(world, "arg1=first", "-Da=${prop.arg1}", "-Dz=${prop.argc}", words=["-word"]) == [
+        "-Da=first", "-Dz=2"]
+
+
 def test_keys_are_not_touched(world):
     assert shown(world, "-D${rcp.home}=1") == ["-D${rcp.home}=1"]
 

@@ -102,10 +102,11 @@ def test_workspaces_do_not_know_of_each_other(world):
 @pytest.mark.parametrize("content, no_data", [
     ("", True), ("              ", True), ("\n\n", True), ("\t \n", True),
     ("99999          ", False), ("99999", False), ("  \n99999", False), ("99999junk", False), ("-99999", False),
-    ("+99999", False),
+    ("+99999", False), ("0", False), ("2147483648", False), ("4294967297", False), ("-9999999999", False),
+    ("99999999999999999999", False),
 ])
 def test_a_lock_file_without_a_living_platform(world, content, no_data):
-    """Blank, or with the number of a process that is gone: this start is the main process."""
+    """Blank, or with the number of a process that is gone or cannot be: this start is the main process."""
     world.install()
     world.write(LOCK, content, 0o600)
     assert world.run().status == 0
@@ -319,8 +320,10 @@ def test_a_pid_file_is_written_anew(world):
 
 
 def test_an_installer_may_not_run_while_a_platform_does(world):
+    """It is refused before the configuration is made."""
     world.install()
     holder = world.holder(ECLIPSE)
     world.write(LOCK, "%d          " % holder.pid)
     world.fatal(world.run("-provManifest", "x"),
                 "QVMRL0122E: Attempting to install while process %d is running." % holder.pid)
+    assert not os.path.exists(CONFIG)
