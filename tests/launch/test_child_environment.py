@@ -147,6 +147,12 @@ def test_a_key_without_a_name_has_no_effect(world, key):
     assert started(world, key + "=1", env={"A": "a"}) == environment(A="a")
 
 
+def test_an_equals_sign_never_belongs_to_a_name(world):
+    """A backslash does not keep it from ending the key, so it stands in the value."""
+    assert started(world, "env.set.A\\=B=1", "env.unset.C\\=D=", "env.set.E=5",
+                   env={"C": "c"}) == environment(A="B=1", E="5")
+
+
 def test_the_settings_end_at_an_empty_key(world):
     assert started(world, "env.set.A=1", "=x", "env.set.B=2") == environment(A="1")
 
@@ -253,6 +259,39 @@ def test_a_dangling_link_counts_as_absent_and_stays_in_the_way(world):
     world.link(LINK, "/mnt/gone/libx.so")
     assert started(world, "library.preload=" + LIBRARY) == environment(LD_PRELOAD=LINK)
     assert tree("/tmp") == ["vantor.rcp.anna.abc.libx.so -> /mnt/gone/libx.so"]
+
+
+@pytest.mark.needs_root("a link of somebody else's")
+def test_a_link_of_somebody_else_that_leads_elsewhere_is_named_all_the_same(world):
+    """In /tmp nobody removes what is another's; that goes unsaid."""
+    world.write(LIBRARY)
+    world.write("/mnt/other/libx.so")
+    world.link(LINK, "/mnt/other/libx.so")
+    world.give(LINK, 0)
+    assert started(world, "library.preload=" + LIBRARY, words=["-debug"]) == environment(LD_PRELOAD=LINK)
+    assert tree("/tmp") == ["vantor.rcp.anna.abc.libx.so -> /mnt/other/libx.so"]
+    assert told(world) == [
+        "setPreload():found property: library.preload=" + LIBRARY,
+        "setPreload():library name = libx.so",
+        "setPreload():linkPath=" + LINK,
+        "setPreload(): link path already exists.",
+        "setPreload(): existing link is to: /mnt/other/libx.so",
+        "setPreload(): removing existing link ...",
+        "setPreload():setting LD_PRELOAD=" + LINK,
+        "setPreload():getenv LD_PRELOAD=" + LINK]
+
+
+def test_the_library_counts_not_a_setting_of_the_variable(world):
+    """It is set last."""
+    assert started(world, "env.set.LD_PRELOAD=/x", "library.preload=/opt/lib/libx.so") == environment(
+        LD_PRELOAD="/opt/lib/libx.so")
+
+
+def test_the_link_is_named_for_the_user_that_a_setting_gives(world):
+    world.write(LIBRARY)
+    assert started(world, "env.set.USER=bob", "library.preload=" + LIBRARY) == environment(
+        USER="bob", LD_PRELOAD="/tmp/vantor.rcp.bob.abc.libx.so")
+    assert tree("/tmp") == ["vantor.rcp.bob.abc.libx.so -> /mnt/my lib/libx.so"]
 
 
 def test_a_library_with_a_blank_that_is_not_there_sets_nothing(world):

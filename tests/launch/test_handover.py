@@ -1,6 +1,7 @@
 """The last act: the platform becomes a child, the lock is handed over, and sometimes the launcher waits."""
 
 import os
+import re
 import signal
 
 import pytest
@@ -169,13 +170,12 @@ def test_a_platform_that_the_system_cannot_start(world):
 def failed_children():
     """The exit statuses of the processes that have said that they could not be executed. The tracer saw them."""
     said, statuses = set(), []
-    for line in read("/dev/shm/strace").splitlines():
-        pid, _, call = line.partition(" ")
-        call = call.strip()
-        if call.startswith("write(") and '"Unable to execute ' in call:
+    for pid, call in re.findall(r"^(\d+) +(.*)$", read("/dev/shm/strace"), re.M):
+        if re.match(r'write\(\d+, "Unable to execute ', call):
             said.add(pid)
-        if call.startswith("exit_group(") and pid in said:
-            statuses.append(int(call[len("exit_group("):].partition(")")[0]))
+        ended = re.match(r"exit_group\((-?\d+)", call)
+        if ended and pid in said:
+            statuses.append(int(ended.group(1)) & 0xff)
     return statuses
 
 

@@ -11,6 +11,7 @@ import subprocess
 
 import pytest
 
+from test_handover import failed_children
 from world import (BASE, ECLIPSE, HEAD, HOME, INSTALL_AREA, LAUNCHER, LOCK, LOG, MAIN, STARTUP, areas, read,
                    read_bytes, system, tree, until)
 
@@ -237,6 +238,27 @@ def test_a_folder_of_that_name_is_removed_as_well(world, libraries):
     assert outcome(world, run(world).status) == (0, 1, ["logoff"], [])
 
 
+def test_the_home_of_the_user_is_one_word_whatever_it_holds(world):
+    """The stale word of an earlier session is removed there: it would end the supervision after the first platform."""
+    home = "/mnt/my * home"
+    install(world)
+    world.write(home + "/.exitData", END)
+    world.plan("write", home + "/.exitData", END, start=1)
+    launcher = world.start(env={"PATH": "/mnt/bin:/usr/bin:/bin", "HOME": home}).wait()
+    assert outcome(world, launcher.status) == (0, 2, [], [])
+
+
+def test_a_folder_that_the_platform_leaves_is_an_unknown_word(world, libraries):
+    """It can be opened, and no line can be read from it."""
+    install(world, libraries["true"])
+    world.plan("wait")
+    launcher = start(world)
+    platform = world.platform()
+    world.folder(EXIT_DATA)
+    platform.end()
+    assert outcome(world, launcher.wait().status) == (0, 1, [], [])
+
+
 def test_the_word_is_left_where_it_is(world, libraries):
     install(world, libraries["true"])
     asks(world, "logoff")
@@ -288,6 +310,24 @@ def test_a_platform_that_ends_without_a_word_is_started_200_times(world):
     assert all(platform.descriptors == platforms[0].descriptors for platform in platforms)
 
 
+def test_no_descriptor_is_lost_with_a_word_that_is_read(world, libraries):
+    """Each platform leaves one, and the library refuses it."""
+    install(world, libraries["false"])
+    world.plan("write", EXIT_DATA, "logoff")
+    world.plan("wait", "write", EXIT_DATA, "logoff", start=1)
+    world.plan("wait", "write", EXIT_DATA, END, start=9)
+    launcher = start(world)
+    second = world.platform(1)
+    until(lambda: read(LOCK) == "%d          " % second.pid, "the second platform is recorded")
+    before = descriptors(launcher.pid)
+    second.end()
+    last = world.platform(9)
+    until(lambda: read(LOCK).startswith("%d  " % last.pid), "the last platform is recorded")
+    assert descriptors(launcher.pid) == before
+    last.end()
+    assert outcome(world, launcher.wait().status) == (0, 10, ["logoff"] * 9, [])
+
+
 def test_each_platform_is_recorded_and_the_lock_is_free_while_it_lives(world):
     """A second launcher becomes a daemon process, which is not supervised: it returns while its platform lives."""
     install(world)
@@ -324,11 +364,25 @@ def test_a_platform_that_is_killed_is_started_again(world):
 
 
 def test_a_failed_wait_is_made_again_for_the_same_platform(world):
-    """It is not started a second time. The first wait is the shell's, the second the platform's."""
+    """It is not started a second time, and recorded again. The first wait is the shell's, the second the platform's."""
     install(world)
     world.plan("sleep", 300, "write", EXIT_DATA, END)
     launcher = start(world, strace=["-e", "trace=wait4", "-e", "inject=wait4:error=EINTR:when=2"])
     assert outcome(world, launcher.wait().status) == (0, 1, [], [])
+    assert world.log().count("QVMRL0306I: lock file released @ <time>\n") == 2
+    platform = world.only_platform()
+    assert (read(LOCK), read(MAIN)) == ("%d          " % platform.pid, "%d    " % platform.pid)
+
+
+def test_a_command_of_a_daemon_process_is_not_supervised(world):
+    """Its word came from the user, and this is the main process: the launcher returns while the platform lives."""
+    install(world)
+    world.plan("wait")
+    assert run(world, "-useDaemon").status == 0
+    platform = world.only_platform()
+    assert platform.alive()
+    assert platform.argv == (HEAD + ["-useDaemon"] + areas() + STARTUP + system(configuration="lockdown")
+                             + INSTALL_AREA)
 
 
 @pytest.mark.world(uid=0)
@@ -422,6 +476,21 @@ def test_a_platform_that_cannot_be_executed(world):
     assert (platform.argv, read(LOCK)) == (PLATFORM, "%d          " % platform.pid)
     log = read(LOG)
     assert log.count(FAILED) == log.count("Unable to execute %s : Exec format error\n" % ECLIPSE) >= 3
+
+
+def test_the_status_of_a_child_that_could_not_be_executed(world):
+    """Each ends with that of a fatal error."""
+    install(world)
+    asks(world, END)
+    world.write(ECLIPSE, "no program", 0o755)
+    launcher = start(world, strace=["-s", "100", "-e", "trace=write,exit_group"])
+    until(lambda: os.path.exists(LOG) and FAILED in read(LOG), "a child has failed")
+    world.stand_in(BASE + "/good")
+    os.rename(BASE + "/good", ECLIPSE)
+    assert launcher.wait().status == 0
+    world.all_ended()
+    statuses = failed_children()
+    assert len(statuses) >= 1 and set(statuses) == {255}
 
 
 def test_a_child_that_failed_leaves_the_earlier_word_to_nobody(world):

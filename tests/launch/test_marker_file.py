@@ -5,8 +5,8 @@ import time
 
 import pytest
 
-from world import (APP, ECLIPSE, HOME, INSTALL_AREA, LAUNCHER, STARTUP, WORKSPACE, areas, lines, read, system, until,
-                   user_logs)
+from world import (APP, ECLIPSE, HOME, INSTALL_AREA, LAUNCHER, STARTUP, TEMP_LOG, WORKSPACE, areas, lines, read, system,
+                   until, user_logs)
 
 MARKER = APP + "/rcp/prov.debug/debug.txt"
 WORDS = ["-debugFile", "-pb4l", "-debug", "-console"]
@@ -89,6 +89,18 @@ def test_the_start_waits_a_second_at_a_time(world):
     start.wait(5)
     assert time.monotonic() - began < 3.5
     assert start.status == 0
+
+
+def test_the_log_in_tmp_is_cleared_away_before(world):
+    """As soon as the log is open, and not only after the wait."""
+    world.install()
+    world.write(TEMP_LOG, "earlier trouble\n")
+    world.write(MARKER)
+    start = waiting(world)
+    until(lambda: not os.path.exists(TEMP_LOG), "the log in /tmp is cleared away")
+    assert start.running() and world.platforms() == []
+    os.unlink(MARKER)
+    assert start.wait(5).status == 0
 
 
 def test_nothing_of_the_configuration_is_made_before(world):

@@ -1,17 +1,20 @@
 """The provisioning launch: before a user's first platform, on a new level, and for an installer."""
 
 import os
+import re
 import shutil
 
 import pytest
 
 from world import (CONFIG, ECLIPSE, HEAD, INSTALL_AREA, JAVA, LOCK, LOG, MAIN, STARTUP, USER_PROPERTIES, WORKSPACE,
-                   areas, lines, read, system, until, user_logs)
+                   areas, lines, read, system, tree, until, user_logs)
 
 LEVEL = "provisioning.manifest.version="
 PROVISIONING = ["provisioning=true", "provisioning.application=org.prov", LEVEL + "2"]
 BEGIN = "QVMRL0129I: ===== Begin Provisioning Parameters ====="
 END = "QVMRL0130I: ===== End Provisioning Parameters ====="
+RELEASED = "QVMRL0306I: lock file released @ "
+NO_FORK = ["-e", "trace=clone,clone3,fork,vfork", "-e", "inject=clone,clone3,fork,vfork:error=EAGAIN"]
 
 
 def install(world, *more, configuration="user", level=None, base=()):
@@ -142,6 +145,16 @@ def test_shared_classes_of_the_line_are_turned_off_too(world):
     assert commands(world) == [provisioning(jvm=["-Xshareclasses=none"])]
 
 
+def test_shared_classes_of_an_old_level_are_removed(world):
+    """Before the application starts, which is the first to see the new level."""
+    install(world, base=["jvm.shareclasses.fullpath=/mnt/cache"])
+    world.write("/mnt/cache/a")
+    world.write("/mnt/cache/sub/b")
+    world.run()
+    assert commands(world) == [provisioning()]
+    assert tree("/mnt/cache") == [] and os.path.isdir("/mnt/cache")
+
+
 def test_the_platform_has_its_shared_classes(world):
     install(world, level="2", base=["vmarg.Dshare=-Xshareclasses:name=x"])
     world.run()
@@ -175,14 +188,38 @@ def test_what_a_traced_provisioning_run_tells(world, base, line):
     assert log[at - 1] == line
 
 
-def test_an_executable_that_cannot_be_started(world):
-    """The start ends as after a provisioning, with status 0, and says why; the lock is free again."""
+@pytest.mark.parametrize("left", [None, "4194303          "])
+def test_an_executable_that_cannot_be_started(world, left):
+    """The start ends as after a provisioning, with status 0, and says why; the lock is free again. The child that
+    failed ends like a launcher, and releases the lock as well. What an earlier platform left in the lock file, whose
+    number no process has, is in the way of neither."""
     install(world)
     world.write(ECLIPSE, "no program", 0o755)
+    if left is not None:
+        world.write(LOCK, left)
     assert world.run().status == 0
     assert world.platforms() == []
-    assert "Unable to execute %s : Exec format error" % ECLIPSE in read(LOG).splitlines()
+    log = read(LOG).splitlines()
+    told = log[log.index(END) + 1:]
+    assert sorted(line[:len(RELEASED)] for line in told if line.startswith("QVMRL")) == [RELEASED] * 2
+    assert [line for line in told if not line.startswith("QVMRL")] == [
+        "Unable to execute %s : Exec format error" % ECLIPSE]
+    (child,) = re.findall(r"^(\d+)    $", read(MAIN))
+    assert read(LOCK) == child + " " * max(10, len(left or "") - len(child))
     world.stand_in(ECLIPSE)
+    assert provisions(world)
+
+
+def test_a_fork_that_fails(world):
+    """The start ends as after a provisioning; nobody is recorded, and the lock is released once, by the launcher."""
+    install(world)
+    assert world.run(strace=NO_FORK).status == 0
+    assert world.platforms() == []
+    log = read(LOG).splitlines()
+    error, released = log[log.index(END) + 1:]
+    assert error.endswith(" : Resource temporarily unavailable")
+    assert released.startswith(RELEASED)
+    assert (read(LOCK), os.path.exists(MAIN)) == ("", False)
     assert provisions(world)
 
 
@@ -256,6 +293,17 @@ def test_levels_are_compared_exactly(world, user, due):
     assert provisions(world) == due
 
 
+def test_a_level_is_compared_as_it_stands_in_the_file(world):
+    """A placeholder in it is not resolved yet. It is when the shared classes are asked about, so these stay: by then
+    the level is the installation's."""
+    install(world, level="${env.L}", base=["jvm.shareclasses.fullpath=/mnt/cache"])
+    world.write("/mnt/cache/a")
+    for _ in range(2):
+        assert world.run("-velmoraWait", env={"L": "2"}).status == 0
+    assert commands(world) == [provisioning("-velmoraWait")] * 2
+    assert tree("/mnt/cache") == ["0644 a"]
+
+
 def test_a_level_that_the_installation_lacks(world):
     """The user has one, so they differ."""
     settled(world)
@@ -268,6 +316,13 @@ def test_a_level_on_neither_side(world):
     """Without one the user has never been provisioned."""
     world.install("user", *PROVISIONING[:2])
     assert [provisions(world) for _ in range(2)] == [True, True]
+
+
+def test_a_program_name_that_is_a_named_argument(world):
+    """It goes where named arguments go, and no word at all is left to be looked at."""
+    install(world)
+    assert world.run(argv0="vmarg.a=b").status == 0
+    assert commands(world) == [provisioning(jvm=["b"])]
 
 
 @pytest.mark.parametrize("missing, due", [
@@ -338,6 +393,15 @@ def test_an_installers_first_run(world):
     assert commands(world) == [provisioning("-provManifest", "-velmoraWait", user=False)]
 
 
+def test_an_installers_words_may_come_from_an_extension(world):
+    """They count like those of the line."""
+    install(world, "config.i.1=-velmoraWait", "config.i.2=-provManifest", level="2")
+    assert provisions(world)
+    assert not provisions(world)
+    assert world.run("-config", "i").status == 0
+    assert commands(world)[2:] == [provisioning(*INSTALLER, user=False)]
+
+
 @pytest.mark.parametrize("word", INSTALLER)
 def test_one_of_the_two_words_alone(world, word):
     """No installer's run: an ordinary start of a settled area, a user's run of a new one."""
@@ -374,6 +438,16 @@ def test_the_installers_word_alone_is_refused_as_well(world):
     assert world.run("-provManifest").status == 255
     assert len(world.platforms()) == 1
     assert "QVMRL0122E: Attempting to install while process %d is running." % platform.pid in read(LOG)
+
+
+def test_an_installers_word_of_an_extension_is_refused_as_well(world):
+    world.install("user", "config.i.1=-provManifest")
+    world.plan("wait")
+    world.run()
+    platform = world.platform()
+    assert world.run("-config", "i").status == 255
+    assert len(world.platforms()) == 1
+    assert "\nQVMRL0122E: Attempting to install while process %d is running. : " % platform.pid in read(LOG)
 
 
 def test_a_daemon_process_never_provisions(world):
