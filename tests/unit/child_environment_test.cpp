@@ -1,10 +1,13 @@
 #include "launcher/command/child_environment.h"
 
 #include "tests/unit/fixtures.h"
+#include "tests/unit/separate_process.h"
 
 #include <cerrno>
 #include <cstdlib>
 #include <filesystem>
+#include <fstream>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace fs = std::filesystem;
@@ -152,6 +155,22 @@ TEST(addEnvSetToCommandLine, AKeyWithoutANameHasNoEffect)
     EXPECT_EQ(after, count);
 }
 
+TEST(addEnvSetToCommandLine, AFailureIsPassedOverWithoutAWord)
+{
+    setenv("VELMORA_B", "b", 1);
+    unsetenv("VELMORA_A");
+    // No name may hold an equals sign, so neither call does anything.
+    EXPECT_EQ(logOf(true,
+                    [] {
+                        setEnvironment({L"env.unset.VELMORA_B=C", L"", L"env.set.VELMORA_A=B", L"1",
+                                        L"env.set.VELMORA_D", L"4"});
+                    }),
+              "");
+    EXPECT_EQ(variable("VELMORA_A"), "(unset)");
+    EXPECT_EQ(variable("VELMORA_B"), "b");
+    EXPECT_EQ(variable("VELMORA_D"), "4");
+}
+
 TEST(addEnvJavaHighZipfds, IsThePropertyOr500)
 {
     setenv("JAVA_HIGH_ZIPFDS", "7", 1);
@@ -271,6 +290,17 @@ TEST(setPreload, SetsAPathWithoutABlankDirectly)
     EXPECT_EQ(ended.log, "setPreload():setting LD_PRELOAD=/opt/lib/libx.so\n");
 }
 
+TEST(setPreload, TakesATabForNoBlank)
+{
+    const TempDir dir;
+    const Ended ended = runAside(dir, true, [] {
+        setPreload(L"/opt/my\tlib/libx.so", L"1234");
+        return variable("LD_PRELOAD");
+    });
+    EXPECT_EQ(ended.result, "/opt/my\tlib/libx.so");
+    EXPECT_EQ(ended.log, "setPreload():setting LD_PRELOAD=/opt/my\tlib/libx.so\n");
+}
+
 TEST(setPreload, ReachesAPathWithABlankThroughANewLink)
 {
     SKIP_WITHOUT_PRIVATE_TMP();
@@ -305,6 +335,23 @@ TEST(setPreload, ReplacesALinkThatLeadsElsewhere)
                              preload.set());
 }
 
+TEST(setPreload, DecisionALinkThatCannotBeRemovedIsNamed)
+{
+    SKIP_WITHOUT_PRIVATE_TMP();
+    const Preload preload;
+    preload.makeLibrary();
+    preload.dir.write("other.so", "");
+    const std::string other = preload.dir.path("other.so");
+    const Ended ended = preload.after([&] {
+        fs::create_symlink(other, preload.link);
+        // What the sticky bit of /tmp does to somebody else's link.
+        ASSERT_TRUE(makeFail(SYS_unlink, EPERM));
+    });
+    EXPECT_EQ(ended.result, preload.link + " -> " + other);
+    EXPECT_EQ(ended.log, preload.names() + preload.existing(other) +
+                             "setPreload(): removing existing link ...\n" + preload.set());
+}
+
 TEST(setPreload, ALinkThatLeadsNowhereStaysAndIsNamedAllTheSame)
 {
     SKIP_WITHOUT_PRIVATE_TMP();
@@ -330,11 +377,19 @@ TEST(setPreload, EndsForAFileInTheLinksPlace)
     SKIP_WITHOUT_PRIVATE_TMP();
     const Preload preload;
     preload.makeLibrary();
-    const Ended ended = preload.after([&] { fs::create_directory(preload.link); });
-    EXPECT_EQ(ended.status, 255);
-    EXPECT_EQ(ended.log, preload.names() + "setPreload(): link path already exists.\n"
-                                           "QVMRL0184E: Getting command path failed! errno = 22 : "
-                                           "Invalid argument\n");
+    for (bool directory : {true, false}) {
+        const Ended ended = preload.after([&] {
+            if (directory)
+                fs::create_directory(preload.link);
+            else
+                std::ofstream(preload.link) << "somebody's";
+        });
+        EXPECT_EQ(ended.status, 255);
+        EXPECT_EQ(ended.log, preload.names() +
+                                 "setPreload(): link path already exists.\n"
+                                 "QVMRL0184E: Getting command path failed! errno = 22 : "
+                                 "Invalid argument\n");
+    }
 }
 
 TEST(setPreload, SetsNothingForALibraryThatDoesNotExist)
@@ -346,15 +401,28 @@ TEST(setPreload, SetsNothingForALibraryThatDoesNotExist)
     EXPECT_EQ(ended.log, preload.found() + "setPreload():getenv LD_PRELOAD=/inherited\n");
 }
 
+TEST(setPreload, TellsOfAVariableThatIsNotSetWhenTheLibraryDoesNotExist)
+{
+    SKIP_WITHOUT_PRIVATE_TMP();
+    const Preload preload;
+    const Ended ended = preload.after([] {});
+    EXPECT_EQ(ended.result, "(unset) -> ");
+    EXPECT_EQ(ended.log, preload.found() +
+                             "QVMRL0081I:  Environmental variable 'LD_PRELOAD' is not set\n\n"
+                             "setPreload():getenv LD_PRELOAD=\n");
+}
+
 TEST(setPreload, EndsWithoutAUserName)
 {
     SKIP_WITHOUT_PRIVATE_TMP();
     const Preload preload;
     preload.makeLibrary();
-    const Ended ended = preload.after([] {}, nullptr);
+    const Ended ended = preload.after([] { errno = EACCES; }, nullptr);
     EXPECT_EQ(ended.status, 255);
-    EXPECT_NE(ended.log.find("\nQVMRL0006E: Couldn't find the user name! : "), std::string::npos)
-        << ended.log;
+    EXPECT_EQ(ended.log, preload.found() +
+                             "setPreload():library name = libx.so\n"
+                             "QVMRL0081I:  Environmental variable 'USER' is not set\n\n"
+                             "QVMRL0006E: Couldn't find the user name! : Permission denied\n");
 }
 
 TEST(setPreload, TakesAnEmptyUserNameAsItIs)

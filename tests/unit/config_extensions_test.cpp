@@ -410,3 +410,21 @@ TEST(getRestartExe, TakesAnEmptyValueForSet)
                            Props({L"config.a.restartExe.linux", L""})),
               L"");
 }
+
+TEST(addConfigExtentionsToArg, NamesTheWorkspaceOnceRepeatsAreRemoved)
+{
+    Props props({L"rcp.data", L"/old"});
+    const Merge merge(Line({L"velmora", L"-config", L"a", L"-data", L"-data", L"/w"}), props);
+    EXPECT_EQ(merge.words, (Texts{L"velmora", L"-data", L"/w"}));
+    EXPECT_EQ(texts(props.list), (Texts{L"rcp.data", L"/w"}));
+}
+
+TEST(addConfigExtentionsToArg, NamesTheWorkspaceBeforeNamedArgumentsAreTakenOut)
+{
+    Props props({L"config.a.1", L"-data", L"config.a.2", L"vmarg.x=-Dq", L"rcp.data", L"/old"});
+    const Merge merge(Line({L"velmora", L"-config", L"a"}), props);
+    EXPECT_EQ(merge.words, (Texts{L"velmora", L"-data"}));
+    EXPECT_EQ(merge.map, (VmargMap{{L"vmarg.x", L"-Dq"}}));
+    EXPECT_EQ(texts(props.list), (Texts{L"config.a.1", L"-data", L"config.a.2", L"vmarg.x=-Dq",
+                                        L"rcp.data", L"vmarg.x=-Dq"}));
+}

@@ -81,6 +81,17 @@ TEST(addVmargsToCommandLine, ReplacesTheFirstWorkspaceOfTheFixAndTurnsItsSeparat
               (Texts{L"-vmargs", L"-Dlog=/ws/a${workspace.location}"}));
 }
 
+TEST(addVmargsToCommandLine, TurnsTheSeparatorsOfTheWorkspaceInTheFix)
+{
+    const Line line({L"velmora"});
+    const Props props({L"vmfix.noconsole", L"-Dl=${workspace.location}"});
+    eConfig = CONFIG_USER;
+    EXPECT_EQ(commandOf([&] {
+                  addVmargsToCommandLine(L"/w\\x", props.list, line.argc, line.argv, false, {});
+              }),
+              (Texts{L"-vmargs", L"-Dl=/w/x"}));
+}
+
 TEST(addVmargsToCommandLine, EmitsAnEmptyFixAsAnEmptyWord)
 {
     EXPECT_EQ(vmargsOf(CONFIG_USER, Line({L"velmora"}), Props({L"vmfix.noconsole", L""}), {}),
@@ -135,6 +146,8 @@ TEST(addClasspathToCommandLine, NamesTheStartUpArchiveInTheForcedConfiguration)
 {
     EXPECT_EQ(classpathOf(CONFIG_MU_SERVICE, Props({L"rcp.base.location", L"/base", L"cp", L"/a"})),
               (Texts{L"-cp", L"/base/startup.jar"}));
+    EXPECT_EQ(classpathOf(CONFIG_MU_SERVICE, Props({L"rcp.base.location", L"/b\\c"})),
+              (Texts{L"-cp", L"/b\\c/startup.jar"}));
 }
 
 TEST(addMainClassToCommandLine, NamesThePlatformsMainClass)

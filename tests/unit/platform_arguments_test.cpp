@@ -74,6 +74,22 @@ TEST(addMainOptionsToCommandLine, PassesPairsOnWhateverTheSecondWordIs)
                   (Texts{option, L"-restart", L"-x"}));
 }
 
+TEST(addMainOptionsToCommandLine, ARepeatOfAWordThatWasASecondWordIsPassedOn)
+{
+    // What counts is the first of each option, and that one was a value here.
+    EXPECT_EQ(userWords(Line({L"velmora", L"-application", L"-restart", L"-restart"})),
+              (Texts{L"-application", L"-restart", L"-restart"}));
+    EXPECT_EQ(userWords(Line({L"velmora", L"-configuration", L"-vm", L"/j", L"-vm", L"/k"})),
+              (Texts{L"/j", L"-vm", L"/k"}));
+}
+
+TEST(addMainOptionsToCommandLine, AWorkspaceCalledVmargsEndsTheWalk)
+{
+    EXPECT_EQ(mainOptions(Line({L"velmora", L"-a", L"-data", L"-vmargs", L"-Xa"})),
+              (Texts{L"--launcher.suppressErrors", L"-a", L"-data", L"-vmargs", L"-configuration",
+                     L"-vmargs/.config"}));
+}
+
 TEST(addMainOptionsToCommandLine, ASecondWordOfAPairMayBeData)
 {
     // "-data" goes along; what follows it is an ordinary word.

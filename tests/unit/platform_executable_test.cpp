@@ -89,6 +89,8 @@ TEST(addStartupToCommandLine, NamesTheBaseLocationsArchive)
 {
     EXPECT_EQ(startupWordsOf(Line({L"velmora"}), Props({L"rcp.base.location", L"/base"})),
               (Texts{L"-startup", L"/base/launcher.jar"}));
+    EXPECT_EQ(startupWordsOf(Line({L"velmora"}), Props({L"rcp.base.location", L"/b\\c"})),
+              (Texts{L"-startup", L"/b\\c/launcher.jar"}));
 }
 
 TEST(addStartupToCommandLine, TakesTheWordBehindPerfJar)

@@ -3,12 +3,14 @@
 #include "launcher/user_area/first_launch.h"
 #include "launcher/user_area/installation.h"
 #include "tests/unit/fixtures.h"
+#include "tests/unit/separate_process.h"
 
 #include <cerrno>
 #include <csignal>
 #include <filesystem>
 #include <sys/inotify.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -103,6 +105,19 @@ TEST(createConfigIni, EndsWithoutTheInstallationsFile)
                      " to be copied",
                  ENOENT));
     EXPECT_FALSE(world.dir.has("ws/.config/config.ini"));
+}
+
+TEST(createConfigIni, EndsWhenTheCopyCannotGetItsName)
+{
+    const World world;
+    world.dir.write("base/config.ini", "a=1\n");
+    EXPECT_TRUE(endsWith(
+        [&] {
+            ASSERT_TRUE(makeFail(SYS_rename, EIO));
+            createConfigIni(world.dir.wide("ws/.config"), world.dir.wide("base"));
+        },
+        "QVMRL0009E: Unable to copy config.ini to the user directory.", EIO));
+    EXPECT_TRUE(fs::is_empty(world.dir.path("ws/.config")));
 }
 
 TEST(createConfigIni, LeavesNothingBehindWhenTheDiskIsFull)

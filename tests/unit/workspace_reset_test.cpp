@@ -2,11 +2,13 @@
 
 #include "launcher/user_area/installation.h"
 #include "tests/unit/fixtures.h"
+#include "tests/unit/separate_process.h"
 
 #include <algorithm>
 #include <cerrno>
 #include <filesystem>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace fs = std::filesystem;
@@ -618,4 +620,17 @@ TEST(handleCopy, DecisionACopyThatCannotBeFinishedLeavesNothingUnderItsName)
                  "QVMRL0193E: Did not encounter EOF while copying file contents");
     EXPECT_FALSE(dir.has("dst"));
     EXPECT_FALSE(dir.has("dst.part"));
+}
+
+TEST(handleCopy, EndsWhenTheCopyCannotGetItsName)
+{
+    const TempDir dir;
+    dir.write("src", "text\n");
+    EXPECT_TRUE(endsWith(
+        [&] {
+            ASSERT_TRUE(makeFail(SYS_rename, EIO));
+            copied(dir, L"dst", L"src");
+        },
+        "QVMRL0113E: Can't copy file  '" + dir.path("src") + "'", EIO));
+    EXPECT_EQ(tree(dir), Names{"src"});
 }
