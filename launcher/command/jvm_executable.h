@@ -15,12 +15,12 @@ bool addVmToCommandLine(const PropertyList& props, const PropertyList& launcherP
                         wchar_t** argv);
 
 /// When the path ends with `windowedName`, puts `consoleName` in its place and returns true.
-/// Fatal, when that is no file: "QVMRL0003E: Specified vm (%ls) does not exist!".
+/// Fatal, when that does not exist (a directory does): "QVMRL0003E: Specified vm (%ls) does not exist!".
 bool isJavaw(std::wstring& vmPath, const std::wstring& windowedName,
              const std::wstring& consoleName);
 
-/// When the path ends with `oldName`, and with `newName` instead is a file, takes that and returns
-/// true.
+/// When the path ends with `oldName`, and with `newName` instead exists (as a directory may), takes
+/// that and returns true.
 bool replaceJavaExecutableName(std::wstring& vmPath, const std::wstring& oldName,
                                const std::wstring& newName);
 

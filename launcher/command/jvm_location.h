@@ -19,16 +19,19 @@ bool getJvmPropertyLocation(PropertyList& props, int argc, wchar_t** argv,
                             bool& notPluginJvm, std::wstring& vmPath);
 
 /// The plug-in's own directory, for a VM below "/eclipse/plugins/". True, with `root` set and
-/// `notPluginJvm` false, when jvm.properties stands there.
+/// `notPluginJvm` false, when jvm.properties stands there; otherwise `notPluginJvm` is true.
 bool getStandardJvmPropertyRoot(const std::wstring& vmPath, std::wstring& root, bool& notPluginJvm);
 
 /// The directory two, three or four levels above the VM; the first that holds jvm.properties.
 bool getInstallJvmPropertyRoot(const std::wstring& vmPath, std::wstring& root);
 
-/// True when `root` followed by "jvm.properties" is a file that can be read.
+/// True when `root` followed by "jvm.properties" exists: it can be opened for reading, as a
+/// directory can.
 bool jvmPropExists(const std::wstring& root);
 
-/// Sets `javaHome` to what stands before "/jvm/bin" in the VM path, else to `fallback`.
+/// Sets `javaHome` to what stands before the first "jvm/bin" of the VM path, less one character
+/// (normally the "/"), and to nothing when nothing stands there; to `fallback` when the path holds
+/// none.
 void getJvmHome(const std::wstring& vmPath, std::wstring& javaHome, const std::wstring& fallback);
 
 #endif

@@ -56,7 +56,9 @@ void doVersionCheck(int argc, wchar_t** argv)
 // The number that follows "-maxargcnt"; 0 when none does.
 static unsigned long declaredCount(int option, int argc, wchar_t** argv)
 {
-    if (option + 1 >= argc)
+    // Decision: a number with a minus sign is none. The C library would turn it into a large one,
+    // and which that is depends on the width.
+    if (option + 1 >= argc || wcschr(argv[option + 1], L'-') != nullptr)
         return 0;
     return wcstoul(argv[option + 1], nullptr, 10);
 }

@@ -238,3 +238,12 @@ TEST(validateNoJavaLibraryPath, AcceptsEverythingElse)
     Line line({L"velmora", L"java.Home", L"JVM.library.path", L"javahome", L"library.path"});
     EXPECT_EQ(logOf(true, [&] { validateNoJavaLibraryPath(line.argc, line.argv); }), "");
 }
+
+TEST(validateIfUrlHandlerLaunch, DecisionANumberWithAMinusSignIsNone)
+{
+    // Four, once taken modulo the width: 2^64 - (2^64 - 4) and 2^32 - (2^32 - 4).
+    for (const wchar_t* count : {L"-18446744073709551612", L"-4294967292", L"-4"}) {
+        Line line({L"velmora", L"-maxargcnt", count, L"a"});
+        EXPECT_FATAL(validateIfUrlHandlerLaunch(line.argc, line.argv), "QVMRL0069E");
+    }
+}

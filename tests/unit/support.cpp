@@ -22,7 +22,7 @@ static std::string readWhole(const std::string& path)
     return bytes.str();
 }
 
-TempDir::TempDir()
+TempDir::TempDir() : owner(getpid())
 {
     const char* base = getenv("TMPDIR");
     dir = std::string(base == nullptr ? "/tmp" : base) + "/velmora-unit-XXXXXX";
@@ -35,6 +35,8 @@ TempDir::TempDir()
 
 TempDir::~TempDir()
 {
+    if (getpid() != owner)
+        return;
     std::error_code ignored;
     fs::remove_all(dir, ignored);
 }

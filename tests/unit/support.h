@@ -35,6 +35,10 @@ struct TempDir {
 
     std::string dir;
     std::wstring wdir;
+
+private:
+    // A forked child that ends by exit leaves its parent's directories alone.
+    int owner;
 };
 
 /// Modifiable words that live as long as the process.
