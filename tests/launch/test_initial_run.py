@@ -137,6 +137,14 @@ def test_any_other_flag_requires_it(world, value):
     assert started(world, "-foo", done="init.done=" + value) == command(*WORDS)
 
 
+def test_the_flag_is_compared_as_it_stands_in_the_file(world):
+    """A placeholder in it is not resolved yet."""
+    world.install("user", *GROUP)
+    world.base_properties("init.done=${env.X}")
+    assert world.run("-foo", env={"X": "true"}).status == 0
+    assert world.only_platform().argv == command(*WORDS)
+
+
 def test_the_next_start_after_it_is_an_ordinary_one(world):
     """The platform writes the flag into the user's properties."""
     world.install("user", *GROUP)
@@ -223,6 +231,34 @@ def test_the_flag_is_known_by_its_beginning(world):
 def test_a_number_that_is_missing(world, group, missing):
     """As many numbers as there are keys of the group, from 1 on."""
     refused(world, "QVMRL0114E: Invalid config.initial arguments. %s not found" % missing, *group)
+
+
+@pytest.mark.parametrize("last, missing", [(3, 4), (4, 5)])
+def test_a_number_twice_counts_twice(world, last, missing):
+    """So the number behind the last one is asked for."""
+    refused(world, "QVMRL0114E: Invalid config.initial arguments. config.initial.%d not found" % missing,
+            "config.initial.1=-initialCompleteFlag", "config.initial.2=done", "config.initial.2=other",
+            *("config.initial.%d=x" % number for number in range(3, last + 1)))
+
+
+@pytest.mark.parametrize("done, required", [("done=true", False), ("other=true", True)])
+def test_of_a_number_twice_the_first_counts(world, done, required):
+    """The tenth word stands for the first, which is missing, and for itself: so ten keys give ten words although the
+    second is there twice."""
+    argv = started(world, "-foo", group=[
+        "config.initial.10=-initialCompleteFlag", "config.initial.2=done", "config.initial.2=other",
+        *("config.initial.%d=x" % number for number in range(3, 10))], done=done)
+    # The merge looks for the first word by its whole key, and ends at once.
+    assert argv == (command() if required else command("-foo"))
+
+
+def test_a_property_without_a_name_hides_the_group(world):
+    """What stands behind it is not looked for."""
+    assert started(world, "-foo", group=["=x", *GROUP]) == command("-foo")
+
+
+def test_a_property_without_a_name_hides_a_damaged_end_of_the_group(world):
+    assert started(world, group=[*GROUP, "=x", "config.initial.7=x"]) == command(*WORDS)
 
 
 def test_every_key_of_the_group_counts(world):

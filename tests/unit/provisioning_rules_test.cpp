@@ -5,6 +5,7 @@
 #include "tests/unit/fixtures.h"
 
 #include <cerrno>
+#include <cstdlib>
 
 TEST(isNewProvisioningLevel, IsTrueWithoutAUserLevel)
 {
@@ -72,6 +73,18 @@ TEST(isInitialRequired, IsFalseWithoutAGroup)
 {
     EXPECT_FALSE(required({}));
     EXPECT_FALSE(required({L"config.initial", L"-initialCompleteFlag", L"config.initia.1", L"x"}));
+}
+
+TEST(isInitialRequired, IsFalseWhenAPairWithoutAKeyHidesTheGroup)
+{
+    EXPECT_FALSE(required(
+        {L"", L"x", L"config.initial.1", L"-initialCompleteFlag", L"config.initial.2", L"done"}));
+}
+
+TEST(isInitialRequired, TakesTheFlagsValueAsItStands)
+{
+    setenv("VELMORA_TEST_X", "true", 1);
+    EXPECT_TRUE(required(GROUP, {L"done", L"${env.VELMORA_TEST_X}"}));
 }
 
 TEST(isInitialRequired, AsksForNothingInOtherConfigurationsEvenIfTheGroupIsBad)
@@ -150,6 +163,24 @@ TEST(isInitialRequired, TheKeyFor10IsItselfBehindTheKeyFor1)
     EXPECT_TRUE(required(inOrder, {L"two", L"true"}));
 }
 
+TEST(isInitialRequired, TakesTheFirstOfANumberThatIsThereTwice)
+{
+    // Ten entries and ten numbers: the key of 10 is the first word and the tenth.
+    const std::initializer_list<const wchar_t*> twice = {
+        L"config.initial.10", L"-initialCompleteFlag",
+        L"config.initial.2",  L"done",
+        L"config.initial.2",  L"other",
+        L"config.initial.3",  L"three",
+        L"config.initial.4",  L"four",
+        L"config.initial.5",  L"five",
+        L"config.initial.6",  L"six",
+        L"config.initial.7",  L"seven",
+        L"config.initial.8",  L"eight",
+        L"config.initial.9",  L"nine"};
+    EXPECT_FALSE(required(twice, {L"done", L"true"}));
+    EXPECT_TRUE(required(twice, {L"other", L"true"}));
+}
+
 static const char* const NO_FLAG =
     "QVMRL0115E: Invalid config.initial arguments. -initialCompleteFlag not found";
 
@@ -170,6 +201,18 @@ TEST(isInitialRequired, EndsWhenANumberIsMissing)
                      "QVMRL0114E: Invalid config.initial arguments. config.initial.1 not found"));
     EXPECT_TRUE(ends({L"config.initial.1", L"-initialCompleteFlag", L"config.initial.3", L"done"},
                      "QVMRL0114E: Invalid config.initial arguments. config.initial.2 not found"));
+}
+
+TEST(isInitialRequired, ANumberThatIsThereTwiceCountsTwice)
+{
+    // Four entries are counted, so a fourth number is asked for; with it five, and so a fifth.
+    EXPECT_TRUE(ends({L"config.initial.1", L"-initialCompleteFlag", L"config.initial.2", L"done",
+                      L"config.initial.2", L"other", L"config.initial.3", L"x"},
+                     "QVMRL0114E: Invalid config.initial arguments. config.initial.4 not found"));
+    EXPECT_TRUE(
+        ends({L"config.initial.1", L"-initialCompleteFlag", L"config.initial.2", L"done",
+              L"config.initial.2", L"other", L"config.initial.3", L"x", L"config.initial.4", L"x"},
+             "QVMRL0114E: Invalid config.initial arguments. config.initial.5 not found"));
 }
 
 TEST(isInitialRequired, EveryKeyOfTheGroupCountsTheRestartExecutableToo)
