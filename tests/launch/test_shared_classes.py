@@ -64,6 +64,13 @@ def test_the_path_is_resolved_and_its_separators_turned(world):
     assert tree(CACHE) == []
 
 
+@pytest.mark.parametrize("level, left", [("2", ["0644 a", "0755 sub/", "0755 sub/sub/", "0644 sub/sub/b"]), ("1", [])])
+def test_a_level_is_resolved_before_it_is_compared(world, level, left):
+    install(world, "provisioning.manifest.version=${env.L}")
+    assert world.run(env={"L": level}).status == 0
+    assert tree(CACHE) == left
+
+
 def test_a_daemon_process_removes_it_too(world):
     install(world)
     holder = world.holder(ECLIPSE)
@@ -134,3 +141,19 @@ def test_a_name_that_looks_like_a_format(world):
     world.run()
     assert told(world) == collected(
         "Can't stat /mnt/cache/%n%s%%  -  Failed with error 2: No such file or directory")
+
+
+def test_a_report_that_is_too_long_for_a_line(world):
+    """100 links that lead nowhere, each of them told. The report is a line of the log like any other, with an empty
+    one at its head: it is cut to 4095 bytes, and the platform starts."""
+    install(world)
+    for number in range(100):
+        world.link(CACHE + "/link%02d" % number, "/mnt/nowhere")
+    assert world.run().status == 0
+    assert len(tree(CACHE)) == 100
+    # The order is that of the folder, which nothing changes any more.
+    whole = collected(*("Can't stat %s/%s  -  Failed with error 2: No such file or directory" % (CACHE, name)
+                        for name in os.listdir(CACHE)))
+    assert len(whole) > 7000
+    assert told(world) == whole[:4095] + "\n"
+    assert world.only_platform().argv == ARGV
