@@ -3,10 +3,17 @@
 #include "tests/unit/separate_process.h"
 #include "tests/unit/support.h"
 
+#include <cerrno>
+#include <cstddef>
 #include <cstdio>
 #include <cstdlib>
+#include <fcntl.h>
 #include <filesystem>
+#include <linux/filter.h>
+#include <linux/seccomp.h>
+#include <sys/prctl.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace fs = std::filesystem;
@@ -215,6 +222,50 @@ TEST(shutdown, ReplacesAnOldRequestAndItsMode)
     }));
 }
 
+// From now on no file can be opened with leave to make it (EACCES), as in a sticky directory whose
+// entries belong to others. False where that cannot be had.
+static bool refuseToMakeFiles()
+{
+    // The flags are the third argument, of which the lower half stands first.
+    struct sock_filter filter[] = {
+        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(struct seccomp_data, nr)),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_openat, 0, 3),
+        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(struct seccomp_data, args[2])),
+        BPF_JUMP(BPF_JMP | BPF_JSET | BPF_K, O_CREAT, 0, 1),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EACCES),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
+    };
+    struct sock_fprog program = {};
+    program.len = sizeof filter / sizeof *filter;
+    program.filter = filter;
+    return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
+           prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) == 0;
+}
+
+TEST(shutdown, UsesARequestThatMayBeWrittenButNotMade)
+{
+    NEEDS_COMPILER();
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        Session session;
+        ASSERT_EQ(session.build(LOGOFF_AFTER_REQUEST), 0);
+        FILE* old = fopen(CMD_FILE, "we");
+        ASSERT_NE(old, nullptr);
+        fputs(std::string(1000, 'x').c_str(), old);
+        fclose(old);
+        EXPECT_EQ(statusOf([&] {
+                      session.enter();
+                      if (!refuseToMakeFiles() ||
+                          open("made", O_WRONLY | O_CREAT | O_CLOEXEC, 0666) >= 0)
+                          _exit(2);
+                      _exit(shutdown() ? YES : NO);
+                  }),
+                  YES);
+        EXPECT_EQ(bytesOf(CMD_FILE), shutdownRecord());
+        EXPECT_EQ(requestMode(), 0666u);
+    }));
+}
+
 TEST(shutdown, ClearsTheUmaskForGood)
 {
     NEEDS_COMPILER();
@@ -224,6 +275,19 @@ TEST(shutdown, ClearsTheUmaskForGood)
         ASSERT_EQ(session.build(NO_LOGOFF), 0);
         session.enter();
         umask(077);
+        EXPECT_FALSE(shutdown());
+        EXPECT_EQ(umask(0), 0u);
+    }));
+}
+
+TEST(shutdown, ClearsTheUmaskBeforeTheRequestIsOpened)
+{
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        Session session;
+        ASSERT_EQ(mkdir(CMD_FILE, 0755), 0);
+        session.enter();
+        umask(027);
         EXPECT_FALSE(shutdown());
         EXPECT_EQ(umask(0), 0u);
     }));
