@@ -6,7 +6,7 @@ import signal
 import time
 
 from lab import Lab, hold_still
-from scenarios import SCENARIOS, mains, prepare
+from scenarios import FATAL, SCENARIOS, mains, prepare
 from world import LOCK, LOG, WORKSPACE, read, read_bytes
 
 SIZES = (2, 8, 32, 64)
@@ -44,14 +44,15 @@ def _judge(lab, processes, old):
         lab.end_strangers()
         for process in processes:
             process.kill()
+    well = len(processes)
     for process in processes:
         said = process.said()
         if process.status != 0 or said:
-            problems.append("end:%s %s" % (process.status, said))
-    if problems:
-        return sorted(set(problems))
+            rows = sorted({found.group() for found in map(FATAL.search, lab.last_lines()) if found})
+            problems.append("end:%s %s%s" % (process.status, " ".join(rows), said))
+            well -= 1
     new = lab.platforms()[old:]
-    if len(new) != len(processes):
+    if len(new) != well:
         problems.append("platforms:%d" % len(new))
     found = mains(new)
     if len(found) != 1:

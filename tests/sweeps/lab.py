@@ -283,3 +283,8 @@ class Lab:
         """The last line of each log."""
         texts = [read(path).rstrip("\n") for path in user_logs() + temp_logs()]
         return [text.rpartition("\n")[2] for text in texts]
+
+    def error_lines(self):
+        """The numbers of all error lines in the logs."""
+        texts = [read(path) for path in user_logs() + temp_logs()]
+        return sorted({number for text in texts for number in re.findall(r"^QVMRL[0-9]{4}E", text, re.M)})

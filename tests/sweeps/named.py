@@ -27,6 +27,11 @@ class Named:
                 and (self._when is None or self._when(case)))
 
 
+def _logged(*numbers):
+    """Whether the case has left one of these lines."""
+    return lambda case: not set(numbers).isdisjoint(case["lines"])
+
+
 RENEWING = ("reset", "renewal")
 OPENING = ("open", "openat")
 DISTURBED = ("errors", "kills", "memory")
@@ -41,7 +46,8 @@ NAMED = (
     Named("number-not-recorded",
           "A failed write of the platform's number into the lock file is logged (QVMRL0051E), and the start goes on.",
           "The next start finds no number and starts a second platform while the first one runs.",
-          "two-platforms", ("errors",), calls=("write",), path=r"\.rcp\.lock"),
+          "two-platforms", ("errors",), calls=("write", "lseek", "_llseek"), path=r"\.rcp\.lock",
+          when=_logged("QVMRL0051E")),
     Named("restart-after-twenty-seconds",
           "A restart waits about 20 seconds for the old platform, then makes its number in the lock file invalid "
           "(QVMRL0013E) without holding the lock.",
@@ -62,7 +68,8 @@ NAMED = (
           "What is missing is missing for ever. Depending on the lines, later starts end with a message of their own "
           "(QVMRL0005E, QVMRL0011E, QVMRL0088E), until somebody removes the file.",
           NEXT_FATAL + r"|short:\.config/rcpinstall\.properties", ("errors",), calls=("read", "write", "fsync"),
-          path=r"\.config/rcpinstall\.properties\.(part|new)"),
+          path=r"\.config/rcpinstall\.properties\.(part|new)",
+          when=lambda case: case["call"] == "read" or _logged("QVMRL0001E", "QVMRL0015E")(case)),
     Named("user-properties-copy-left",
           "The results of the removal and the renaming at the end are not looked at.",
           "The plain copy stays beside the user's rcpinstall.properties. Nothing reads it.",
@@ -73,7 +80,8 @@ NAMED = (
           "the lines so far stay.",
           "The short platform.xml is believed for ever, until a reset or until somebody removes it.",
           "short:" + UPDATE + r"platform\.xml", ("errors",), calls=("read", "write", "fsync"),
-          path=r".*/platform\.xml(\.part)?"),
+          path=r".*/platform\.xml(\.part)?",
+          when=lambda case: case["call"] == "read" or _logged("QVMRL0103E")(case)),
     Named("words-short-for-now",
           "args.properties is written in its place, by every start but a restart.",
           "After a kill at that moment it is short until the next start writes it. A restart in between believes it.",
@@ -112,6 +120,11 @@ NAMED = (
           "What cannot be removed of an old backup that was moved aside is left without a word.",
           ".configbakdeleteme0001 to 0005 stay until a later reset removes them.",
           r"left(-short)?:\.configbakdeleteme000[1-5](/.*)?", ("errors", "kills"), RENEWING),
+    Named("workspace-made-by-another",
+          "Whether the workspace is there is asked before it is made, without a lock, and one that cannot be made because it "
+          "is there by now is a failure.",
+          "Of several first starts within a millisecond one may end with QVMRL0083E. Its user starts it again.",
+          "end:255 QVMRL0083E", ("crowds",), when=lambda case: not case["again"]),
     Named("log-shared",
           "velmora.log is begun anew by each launcher, and the last line of each is written after the lock was released.",
           "The last line of one launcher may stand in the middle of the next one's log, with zero bytes before it.",

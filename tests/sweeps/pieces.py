@@ -1,5 +1,6 @@
 """What a sweep needs besides the tree: built once, outside of any world."""
 
+import hashlib
 import os
 import pathlib
 import subprocess
@@ -27,3 +28,13 @@ def pieces(launcher):
             "lockdown": built("lockdown.so", width, "-shared", "-fPIC", "-nostdlib", "lockdown.c"),
             "no_memory": built("no_memory.so", width, "-shared", "-fPIC", str(HERE / "no_memory.c"), "-ldl"),
         }
+
+
+def sources_digest():
+    """Twelve digits that stand for the launcher's sources, so that figures are not taken for another tree's."""
+    found = hashlib.sha256()
+    for top in ("diag", "platform", "launcher"):
+        for path in sorted((ROOT / top).rglob("*")):
+            if path.suffix in (".cpp", ".h"):
+                found.update(str(path.relative_to(ROOT)).encode() + b"\0" + path.read_bytes() + b"\0")
+    return found.hexdigest()[:12]

@@ -114,7 +114,7 @@ def disturbed(lab, scenario, call, what):
     status, said = lab.run(*scenario.words, strace=call.injection(what))
     trace = read(TRACE)
     case = {"scenario": scenario.name, "call": call.name, "number": call.number, "what": what, "path": call.path(),
-            "status": status, "row": "", "problems": []}
+            "status": status, "row": "", "lines": lab.error_lines(), "problems": []}
     if what == "KILL":
         if status != -9:
             case["problems"] = ["not-reached"]
@@ -140,5 +140,6 @@ def disturb(pieces, name, jobs):
         except Exception as trouble:  # what cannot be judged is a failure of that case, not of all
             lab.end_strangers()
             cases.append({"scenario": name, "call": call.name, "number": call.number, "what": what,
-                          "path": call.path(), "status": None, "row": "", "problems": ["unjudged:%s" % trouble]})
+                          "path": call.path(), "status": None, "row": "", "lines": [],
+                          "problems": ["unjudged:%s" % trouble]})
     return cases

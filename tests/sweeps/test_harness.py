@@ -85,11 +85,12 @@ def test_ends_that_are_not_as_promised_are_seen(status, said, last_line, problem
 
 def test_problems_are_failures_unless_they_are_named():
     """A named problem counts only where its name says, and never hides another one."""
-    case = {"scenario": "first", "call": "write", "path": WORKSPACE + "/.rcp.lock", "problems": ["two-platforms"]}
+    case = {"scenario": "first", "call": "write", "path": WORKSPACE + "/.rcp.lock",
+            "lines": ["QVMRL0051E", "QVMRL0090E"], "problems": ["two-platforms"]}
     named.judge("errors", case)
     assert (case["verdict"], case["named"]) == ("named", ["number-not-recorded"])
     for other in (dict(case, call="flock"), dict(case, path=WORKSPACE + "/.pipe"),
-                  dict(case, problems=["two-platforms", "signal:11"]), dict(case, problems=["silent"])):
+                  dict(case, lines=["QVMRL0090E"]), dict(case, problems=["two-platforms", "signal:11"]), dict(case, problems=["silent"])):
         named.judge("errors", other)
         assert other["verdict"] == "failed"
     named.judge("kills", case)
