@@ -16,7 +16,7 @@ static void endInvalidSubstitution(const std::wstring& text)
 
 // What values may bring in on top of what was asked for, in characters, before the replacing counts
 // as endless.
-static const unsigned long long MOST_BROUGHT_IN = 1ULL << 24;
+static const unsigned long long MOST_BROUGHT_IN = 1ULL << 20;
 
 static bool hasAtEnd(const std::wstring& s, const std::wstring& end)
 {

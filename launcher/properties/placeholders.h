@@ -21,7 +21,8 @@
 bool replaceEvery(const std::wstring& placeholder, const std::wstring& value, std::wstring& s);
 
 /// Replaces the standard placeholders, in the order above. True when there was one.
-/// Fatal: QVMRL0088E for a value that contains the very placeholder that it replaces.
+/// Fatal: QVMRL0088E for a value that contains the very placeholder that it replaces, or that
+/// completes one with what it meets, for ever.
 bool replaceStdPlaceholders(const std::wstring& workspace, const std::wstring& rcpHome,
                             std::wstring& s);
 

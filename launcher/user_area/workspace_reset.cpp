@@ -163,6 +163,7 @@ void resetMetaDataDirs(const std::wstring& workspaceDir, const std::wstring& con
             // Decision: an empty value is passed over; it would name the whole plug-in area.
             if (pair[1][0] == L'\0')
                 continue;
+            // Decision: the whole path is converted, a backslash of the value included.
             std::wstring directory = pluginState + pair[1];
             convertToOsSeparator(directory);
             std::wstring problems;

@@ -4,6 +4,7 @@
 //   CFG + "bak"              the configuration as it was (".configbak" beside ".config")
 //   UPD/registry, UPD/bookmarks.xml   carried over, by way of WS/registry.old, WS/bookmarks.xml.old
 //   WS/platform.xml.old      a record; it stays there
+//   WS/<name>.old.part       a copy that a kill cut short; the next copy of that file clears it
 //   <path> + "deleteme0001" to "deleteme0005"   where a directory in the way is moved before it is
 //                            removed; what an interrupted run leaves there is cleared by the next
 // Fatal lines of this page end with the system's reason.
@@ -34,8 +35,8 @@ void resetWorkspace(const std::wstring& workspaceDir, const std::wstring& config
                     const std::wstring& baseLocation);
 
 /// Deletes the directories below WS/.metadata/.plugins/ that the "resetDir." properties of the
-/// user's rcpinstall.properties (or else the installation's) name; a value is not checked for
-/// "..". Fatal: QVMRL0106E (neither file), QVMRL0107E with the list of what could not be removed.
+/// user's rcpinstall.properties (or else the installation's) name; an empty value is passed over, a
+/// value is not checked for "..". Fatal: QVMRL0106E (neither file), QVMRL0107E with the list of what could not be removed.
 void resetMetaDataDirs(const std::wstring& workspaceDir, const std::wstring& configDir,
                        const std::wstring& baseLocation);
 

@@ -464,15 +464,15 @@ TEST(replaceUserPlaceholders, StepTowardsTheStartBeginsTheCountAnew)
 TEST(replaceUserPlaceholders, ValueThatBringsItselfInBesideAnotherFails)
 {
     // Each round puts in "${prop.d}${prop.a}" (18 characters, counted as 19) and the value of a,
-    // and begins the count of repetitions again. 2^24 = 16777216 may be brought in like this; the
+    // and begins the count of repetitions again. 2^20 = 1048576 may be brought in like this; the
     // very first value is free.
     const OwnList empty({L"d", L"${prop.d}${prop.a}", L"a", L""});
-    // 838860 rounds of 1 + 19 leave 16: 1 for the a, and then 15 are too few for the other.
+    // 52428 rounds of 1 + 19 leave 16: 1 for the a, and then 15 are too few for the other.
     EXPECT_EQ(user(L"${prop.d}", empty.list), (Outcome{false, L"${prop.d}${prop.a}"}));
     const OwnList growing({L"d", L"${prop.d}${prop.a}", L"a", L"1"});
-    // 798915 rounds of 2 + 19 leave 1: the next a, number 798916, is one too many.
+    // 49932 rounds of 2 + 19 leave 4: 2 for the next a, and then 2 are too few for the other.
     EXPECT_EQ(user(L"${prop.d}", growing.list),
-              (Outcome{false, L"${prop.d}" + std::wstring(798916, L'1')}));
+              (Outcome{false, L"${prop.d}${prop.a}" + std::wstring(49933, L'1')}));
 }
 
 TEST(replaceUserPlaceholders, ValueWithManyPlaceholdersIsNoRepetition)
