@@ -15,7 +15,8 @@ bool addVmToCommandLine(const PropertyList& props, const PropertyList& launcherP
                         wchar_t** argv);
 
 /// When the path ends with `windowedName`, puts `consoleName` in its place and returns true.
-/// Fatal, when that does not exist (a directory does): "QVMRL0003E: Specified vm (%ls) does not exist!".
+/// Fatal, when that does not exist (a directory does):
+/// "QVMRL0003E: Specified vm (%ls) does not exist!".
 bool isJavaw(std::wstring& vmPath, const std::wstring& windowedName,
              const std::wstring& consoleName);
 

@@ -36,7 +36,8 @@ void resetWorkspace(const std::wstring& workspaceDir, const std::wstring& config
 
 /// Deletes the directories below WS/.metadata/.plugins/ that the "resetDir." properties of the
 /// user's rcpinstall.properties (or else the installation's) name; an empty value is passed over, a
-/// value is not checked for "..". Fatal: QVMRL0106E (neither file), QVMRL0107E with the list of what could not be removed.
+/// value is not checked for "..". Fatal: QVMRL0106E (neither file), QVMRL0107E with the list of
+/// what could not be removed.
 void resetMetaDataDirs(const std::wstring& workspaceDir, const std::wstring& configDir,
                        const std::wstring& baseLocation);
 

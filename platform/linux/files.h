@@ -46,8 +46,8 @@ std::wstring placeForNewFile(const std::wstring& target);
 /// that was opened. Null on failure, with the errno of the target.
 FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mode);
 
-/// Puts what was written, flushed and closed at `place` to `target`. On failure nothing is left, and
-/// errno tells why.
+/// Puts what was written, flushed and closed at `place` to `target`. On failure nothing is left,
+/// and errno tells why.
 bool publishNewFile(const std::wstring& place, const std::wstring& target);
 
 /// copyFile to `place`, flushed to the disk when that is not `to`; messages name `to`. Always
