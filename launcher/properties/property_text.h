@@ -12,8 +12,8 @@ void FilterProp(std::wstring& key);
 
 /// What becomes of a value: a doubled backslash gives one; "\u" and the up to four characters
 /// behind it give the character of the hexadecimal digits that they begin with ("\u41xy" gives
-/// "A"); before any other character the backslash goes. Then trimString. A character of code 0 is kept
-/// here, and cuts the value where it is read as a C string.
+/// "A"); before any other character the backslash goes. Then trimString. A character of code 0 is
+/// kept here, and cuts the value where it is read as a C string.
 void FilterValue(std::wstring& value);
 
 /// True for a line that begins with "#" or "!": the rule of copied lines. The reader knows "#"

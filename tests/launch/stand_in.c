@@ -25,9 +25,9 @@
 
 #define RECORDS "/dev/shm/stand-in"
 
-extern char **environ;
+extern char** environ;
 
-static void give_up(const char *what)
+static void give_up(const char* what)
 {
     /* The launcher's own standard error stays clean, so trouble is told in a file. */
     int fd = open(RECORDS "/trouble", O_WRONLY | O_CREAT | O_APPEND, 0666);
@@ -36,7 +36,7 @@ static void give_up(const char *what)
     _exit(120);
 }
 
-static void put(FILE *record, const char *format, ...)
+static void put(FILE* record, const char* format, ...)
 {
     va_list values;
     va_start(values, format);
@@ -45,7 +45,7 @@ static void put(FILE *record, const char *format, ...)
     putc(0, record);
 }
 
-static void put_words(FILE *record, char **words)
+static void put_words(FILE* record, char** words)
 {
     int count = 0;
     while (words[count])
@@ -55,7 +55,7 @@ static void put_words(FILE *record, char **words)
         put(record, "%s", words[i]);
 }
 
-static char *link_target(const char *path, char target[4097])
+static char* link_target(const char* path, char target[4097])
 {
     ssize_t length = readlink(path, target, 4096);
     target[length > 0 ? length : 0] = 0;
@@ -63,14 +63,14 @@ static char *link_target(const char *path, char target[4097])
 }
 
 /* The open descriptors, as they were before this program opened one of its own. */
-static char **descriptors(void)
+static char** descriptors(void)
 {
-    char **words = calloc(4096, sizeof *words);
+    char** words = calloc(4096, sizeof *words);
     int count = 0;
-    DIR *folder = opendir("/proc/self/fd");
+    DIR* folder = opendir("/proc/self/fd");
     if (!folder)
         give_up("/proc/self/fd");
-    for (struct dirent *entry; (entry = readdir(folder)) && count < 4095;) {
+    for (struct dirent* entry; (entry = readdir(folder)) && count < 4095;) {
         char path[64], target[4097];
         int number = atoi(entry->d_name);
         if (entry->d_name[0] == '.' || number == dirfd(folder))
@@ -83,7 +83,7 @@ static char **descriptors(void)
     return words;
 }
 
-static const char *own_status(void)
+static const char* own_status(void)
 {
     static char text[8192];
     int fd = open("/proc/self/status", O_RDONLY | O_CLOEXEC);
@@ -106,19 +106,19 @@ static int claim_number(void)
     return -1;
 }
 
-static void record_start(int number, char **argv, const char *status, const char *folder, mode_t mask,
-                         char **open_ones)
+static void record_start(int number, char** argv, const char* status, const char* folder,
+                         mode_t mask, char** open_ones)
 {
     char part[64], name[64], target[4097];
     snprintf(part, sizeof part, "%d/part", number);
     snprintf(name, sizeof name, "%d/record", number);
-    FILE *record = fopen(part, "we");
+    FILE* record = fopen(part, "we");
     if (!record)
         give_up(part);
     put(record, "%d", (int)getpid());
     put(record, "%s", status);
     put(record, "%s", link_target("/proc/self/exe", target));
-    put(record, "%s", (const char *)getauxval(AT_EXECFN));
+    put(record, "%s", (const char*)getauxval(AT_EXECFN));
     put(record, "%s", folder);
     put(record, "%o", (unsigned)mask);
     put_words(record, argv);
@@ -130,11 +130,11 @@ static void record_start(int number, char **argv, const char *status, const char
 
 static char *plan, *plan_end;
 
-static char *next_word(void)
+static char* next_word(void)
 {
     if (plan >= plan_end)
         give_up("a plan without the word that it needs");
-    char *word = plan;
+    char* word = plan;
     plan += strlen(plan) + 1;
     return word;
 }
@@ -143,7 +143,7 @@ static void read_plan(int number)
 {
     char name[32];
     snprintf(name, sizeof name, RECORDS "/plan.%d", number);
-    FILE *file = fopen(name, "re");
+    FILE* file = fopen(name, "re");
     if (!file)
         file = fopen(RECORDS "/plan", "re");
     if (!file)
@@ -166,10 +166,10 @@ static void write_file(int more)
     close(fd);
 }
 
-static void follow_plan(const sigset_t *the_end)
+static void follow_plan(const sigset_t* the_end)
 {
     while (plan && plan < plan_end) {
-        const char *verb = next_word();
+        const char* verb = next_word();
         if (!strcmp(verb, "write"))
             write_file(O_TRUNC);
         else if (!strcmp(verb, "append"))
@@ -189,14 +189,14 @@ static void follow_plan(const sigset_t *the_end)
     }
 }
 
-int main(int argc, char **argv)
+int main(int argc, char** argv)
 {
     (void)argc;
-    char **open_ones = descriptors();
+    char** open_ones = descriptors();
     if (getenv("STAND_IN_HOLDS"))
         for (;;)
             pause();
-    const char *status = own_status();
+    const char* status = own_status();
     char folder[4097];
     if (!getcwd(folder, sizeof folder))
         folder[0] = 0;
