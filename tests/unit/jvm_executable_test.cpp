@@ -178,6 +178,14 @@ TEST(addVmToCommandLine, TakesTheConsoleVariantOfEachNameForAConsole)
     }
 }
 
+TEST(addVmToCommandLine, FindsTheConsoleVariantBehindBackslashesAndKeepsThem)
+{
+    const Bin bin({"java"});
+    const std::wstring windowed = bin.dir.wdir + L"\\bin\\javaw";
+    EXPECT_EQ(vmWords({L"vm", windowed.c_str()}, Line({L"velmora", L"-console"})),
+              (Texts{L"-vm", bin.dir.wdir + L"\\bin\\java"}));
+}
+
 TEST(addVmToCommandLine, KeepsTheWindowedVariantWithoutAConsole)
 {
     const Bin bin({"java", "qv", "quillon"});
@@ -210,6 +218,24 @@ TEST(addVmToCommandLine, RenamesTheWindowedExecutable)
     EXPECT_EQ(bin.chosen(L"java", L"-x", {L"javaw.exe.name.linux", L"myjavaw"}), L"java");
 }
 
+TEST(addVmToCommandLine, RenamesOnceThoughTheNewNameEndsLikeAnotherOldOne)
+{
+    const Bin bin({"myqv", "mymyqv", "myqvw", "mymyqvw"});
+    EXPECT_EQ(bin.chosen(L"java", L"-x", {L"java.exe.name.linux", L"myqv"}), L"myqv");
+    EXPECT_EQ(bin.chosen(L"javaw", L"-x", {L"javaw.exe.name.linux", L"myqvw"}), L"myqvw");
+}
+
+TEST(addVmToCommandLine, AnEmptyNewNameLeavesTheDirectory)
+{
+    const Bin bin({"java"});
+    const Props props({L"vm", bin.at(L"java").c_str()});
+    const Props launcher({L"java.exe.name.linux", L""});
+    const Line line({L"velmora"});
+    EXPECT_EQ(
+        commandOf([&] { addVmToCommandLine(props.list, launcher.list, line.argc, line.argv); }),
+        (Texts{L"-vm", bin.dir.wdir + L"/bin/"}));
+}
+
 TEST(addVmToCommandLine, KeepsTheVmWhenTheNewNameDoesNotExist)
 {
     const Bin bin({"java"});
@@ -238,4 +264,17 @@ TEST(addVmToCommandLine, PassesALibraryOnAsItIs)
     }
     EXPECT_EQ(vmWords({L"vm", L"/jvm/java.EE"}, Line({L"velmora"})),
               (Texts{L"-vm", L"/jvm/java.EE"}));
+}
+
+TEST(addVmToCommandLine, MakesALibraryTheProgramOfAService)
+{
+    eConfig = CONFIG_SERVICE;
+    const Props props({L"vm", L"/jvm/default.ee"});
+    const Line line({L"velmora"});
+    bool isLibrary = false;
+    EXPECT_EQ(commandOf([&] {
+                  isLibrary = addVmToCommandLine(props.list, PropertyList(), line.argc, line.argv);
+              }),
+              (Texts{L"/jvm/default.ee"}));
+    EXPECT_TRUE(isLibrary);
 }

@@ -52,6 +52,13 @@ TEST(getStandardJvmPropertyRoot, TakesTheFirstPluginsDirectory)
     EXPECT_EQ(standardRoot(dir, dir.wide("eclipse/plugins/a/eclipse/plugins/b/java")), L"(none)");
 }
 
+TEST(getStandardJvmPropertyRoot, TakesAnEmptyNameForThePlugins)
+{
+    const TempDir dir;
+    dir.write("eclipse/plugins/jvm.properties", "");
+    EXPECT_EQ(standardRoot(dir, dir.wide("eclipse/plugins//x/java")), L"/eclipse/plugins//");
+}
+
 static std::wstring installRoot(const TempDir& dir, const std::wstring& vm)
 {
     std::wstring root = dir.wdir + L"(none)";
