@@ -114,6 +114,44 @@ TEST(getServiceInstallDir, EndsWhenThePathRunsOutOfSlashes)
     EXPECT_EQ(log.substr(0, line.size()), line);
 }
 
+// Where below `world` an executable lies whose directory has this many components; empty when the
+// world itself has too many.
+static std::string placeWithComponents(const TempDir& world, long components)
+{
+    const fs::path dir = fs::canonical(world.dir).relative_path();
+    std::string place;
+    for (long i = std::distance(dir.begin(), dir.end()) + 1; i <= components; ++i)
+        place += std::to_string(i) + "/";
+    return place.empty() ? "" : place + "velmora";
+}
+
+TEST(getServiceInstallDir, SixComponentsLeaveNothingForTheSixthAncestor)
+{
+    SKIP_WITHOUT_PRIVATE_TMP();
+    const TempDir world;
+    const std::string place = placeWithComponents(world, 6);
+    if (place.empty())
+        GTEST_SKIP() << "TMPDIR has six levels or more";
+    const Ended ended = runInstalled(world, place, "ServiceDir");
+    EXPECT_EQ(ended.status, 255);
+    EXPECT_EQ(world.read("velmora.log"),
+              "\nQVMRL0048E: Unable to locate the directory containing /the/program : "
+              "No such file or directory\n");
+}
+
+TEST(getServiceInstallDir, SevenComponentsLeaveTheFirst)
+{
+    SKIP_WITHOUT_PRIVATE_TMP();
+    const TempDir world;
+    const std::string place = placeWithComponents(world, 7);
+    if (place.empty())
+        GTEST_SKIP() << "TMPDIR has seven levels or more";
+    const fs::path dir = (fs::canonical(world.dir) / place).parent_path();
+    const std::string first = "/" + dir.relative_path().begin()->string();
+    EXPECT_EQ(runInstalled(world, place, "ServiceDir").result,
+              dir.parent_path().parent_path().string() + " " + first);
+}
+
 namespace {
 struct Location {
     std::wstring path;
@@ -178,8 +216,9 @@ TEST(getWorkspaceLocation, TakesTheWordBehindDataInEveryOtherConfiguration)
 static std::wstring dataGives(const wchar_t* value)
 {
     eConfig = CONFIG_USER;
-    const Location location = workspaceOf(Line({L"velmora", L"-data", value}),
-                                          Props({L"name", L"n", L"rcp.data", L"/p"}));
+    const Location location = workspaceOf(
+        Line({L"velmora", L"-data", value}),
+        Props({L"name", L"n", L"slash", L"x/", L"h", L"${rcp.home}", L"rcp.data", L"/p"}));
     EXPECT_EQ(location.result, 1);
     return location.path;
 }
@@ -205,6 +244,17 @@ TEST(getWorkspaceLocation, ResolvesTheUserPlaceholdersOfDataAndIgnoresAFailure)
     setenv("VELMORA_X", "v", 1);
     EXPECT_EQ(dataGives(L"/${env.VELMORA_X}/${prop.name}"), L"/v/n");
     EXPECT_EQ(dataGives(L"/${prop.nosuch}"), L"/${prop.nosuch}");
+}
+
+TEST(getWorkspaceLocation, DropsTheSeparatorOfDataBeforeAnythingIsReplaced)
+{
+    EXPECT_EQ(dataGives(L"/${prop.slash}"), L"/x/");
+    EXPECT_EQ(dataGives(L"/${prop.slash}/"), L"/x/");
+}
+
+TEST(getWorkspaceLocation, ReplacesRcpHomeOfDataBeforeTheUserPlaceholders)
+{
+    EXPECT_EQ(dataGives(L"${prop.h}/w"), L"${rcp.home}/w");
 }
 
 TEST(getWorkspaceLocation, KeepsARelativeDataAndItsBackslashes)

@@ -144,6 +144,14 @@ TEST(validateIfUrlHandlerLaunch, DoesNotCountARestart)
     EXPECT_TRUE(refusesCount(tooHigh));
 }
 
+TEST(validateIfUrlHandlerLaunch, CountsASecondRestart)
+{
+    Line right({L"velmora", L"-maxargcnt", L"4", L"-restart", L"-restart"});
+    EXPECT_EQ(acceptsCount(right), "");
+    Line tooLow({L"velmora", L"-maxargcnt", L"3", L"-restart", L"-restart"});
+    EXPECT_TRUE(refusesCount(tooLow));
+}
+
 TEST(validateIfUrlHandlerLaunch, CountsNothingForNoNumber)
 {
     Line last({L"velmora", L"-maxargcnt"});
