@@ -90,7 +90,7 @@ static std::string dataOf(const wchar_t* value)
 {
     setenv("VELMORA_X", "v", 1);
     const std::string record =
-        recordOf(Line({L"velmora", L"-data", value}), L"/x", {L"name", L"n"});
+        recordOf(Line({L"velmora", L"-data", value}), L"/x", {L"name", L"n", L"h", L"${rcp.home}"});
     const std::string head = "arg0=/x\narg1=-data\narg2=";
     EXPECT_EQ(record.substr(0, head.size()), head);
     return record.substr(head.size(), record.find('\n', head.size()) - head.size());
@@ -103,6 +103,11 @@ TEST(writeStartupArgs, ResolvesThePlaceholdersOfData)
     EXPECT_EQ(dataOf(L"${rcp.home}/${rcp.home}"), "/opt/app/${rcp.home}");
     EXPECT_EQ(dataOf(L"${prop.nosuch}/a"), "${prop.nosuch}/a");
     EXPECT_EQ(dataOf(L"relative"), "relative");
+}
+
+TEST(writeStartupArgs, ReplacesRcpHomeOfDataBeforeTheUserPlaceholders)
+{
+    EXPECT_EQ(dataOf(L"${prop.h}/w"), "${rcp.home}/w");
 }
 
 TEST(writeStartupArgs, KeepsASeparatorAtTheEndOfData)
@@ -125,6 +130,15 @@ TEST(writeStartupArgs, SearchesDataFromTheProgramPathOn)
     EXPECT_EQ(recordOf(Line({L"-data", L"${rcp.home}", L"-data", L"${rcp.home}"})),
               std::string("arg0=/x\narg1=/opt/app\narg2=-data\narg3=${rcp.home}\nargc=4\n") +
                   LIBRARY_PATH + "\n");
+}
+
+TEST(writeStartupArgs, AValueOfDataThatIsLeftOutIsNotMadeUpForByTheNextWord)
+{
+    const std::string expected =
+        std::string("arg0=/x\narg1=-data\narg2=${rcp.home}\nargc=3\n") + LIBRARY_PATH + "\n";
+    EXPECT_EQ(recordOf(Line({L"velmora", L"-data", L"-resetconfig", L"${rcp.home}"})), expected);
+    EXPECT_EQ(recordOf(Line({L"velmora", L"-data", L"-rcp_old_pid", L"1", L"${rcp.home}"})),
+              expected);
 }
 
 TEST(writeStartupArgs, RecordsDataAsTheLastWordAsItIs)

@@ -249,6 +249,13 @@ TEST(createRCPInstallProps, SplitsALineOfMoreThan2024Bytes)
     EXPECT_EQ(linesOf(full + "y\nb=1\n"), full + "\ny\nb=1\n");
 }
 
+TEST(createRCPInstallProps, PiecesThatCutACharacterInTwoAreEmptyLines)
+{
+    // The first piece ends behind byte 2024, the first of the two of U+00E9; the second piece
+    // begins with the other.
+    EXPECT_EQ(linesOf("a=" + std::string(2021, 'x') + "\xc3\xa9yy\nb=1\n"), "\n\nb=1\n");
+}
+
 TEST(createRCPInstallProps, EndsWhenARequiredValueIsMissing)
 {
     const std::vector<std::wstring> all(REQUIRED.begin(), REQUIRED.end());
@@ -364,6 +371,7 @@ TEST(createRCPInstallProps, LeavesNoUserFileWhenTheNewOneCannotBeOpened)
                        world.dir.path(std::string(USER_FILE) + ".new"));
     EXPECT_EQ(logOf(false, [&] { world.create(Props(REQUIRED)); }), CANNOT_OPEN);
     EXPECT_FALSE(fs::exists(world.dir.path(USER_FILE)));
+    EXPECT_TRUE(userFirstLaunch);
 }
 
 TEST(fixUserRCPInstallProperties, LogsABlockThatCannotBeWritten)
@@ -385,9 +393,10 @@ TEST(fixUserRCPInstallProperties, LogsALineThatCannotBeWrittenAndGoesOn)
     world.dir.write("a", lines);
     fs::create_symlink("/dev/full", world.dir.path("b"));
     const std::string log = logOf(false, [&] { EXPECT_EQ(fixed(world, "a", "b"), 0); });
-    EXPECT_EQ(log.substr(0, log.find('\n')),
-              "QVMRL0001E: Error while copying base rcpinstall.properties to user specific "
-              "rcpinstall.properties file.");
+    const std::string line = "QVMRL0001E: Error while copying base rcpinstall.properties to user "
+                             "specific rcpinstall.properties file.\n";
+    EXPECT_EQ(log.substr(0, line.size()), line);
+    EXPECT_NE(log.find(line, line.size()), std::string::npos);
     const std::string last = "QVMRL0015E: Unable to append values to user specific "
                              "rcpinstall.properties file.\n";
     EXPECT_EQ(log.substr(log.size() - last.size()), last);
