@@ -170,6 +170,9 @@ void err_doit(bool withErrno, std::string& out, const char* format, va_list argu
     }
     endLine(line);
     writeLine(line);
+    // An error line does not wait for the end of a block: it may be the last of the process.
+    if (logFILE != nullptr)
+        fflush(logFILE);
     out = line;
 }
 

@@ -49,9 +49,9 @@ private:
     bool previous = false;
 };
 
-/// While one of these lives, the lines that are written belong together: they reach the file when
-/// it ends. For the parameters of a launch, which are many short lines. The process must neither
-/// fork nor end meanwhile.
+/// While one of these lives, the trace lines that are written belong together: they reach the file
+/// when it ends, or with the next error line. For the parameters of a launch, which are many short
+/// lines. The process must not fork meanwhile.
 struct LineBlock {
     LineBlock();
     ~LineBlock();

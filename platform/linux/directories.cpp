@@ -131,8 +131,10 @@ bool removeFileWithPatternFromDirectory(const std::wstring& dir, const std::wstr
     wcstochar(narrowDir, dir.c_str());
     // Decision: a pattern that the locale cannot convert matches nothing. As an empty text it would
     // be a part of every name.
-    if (wstrtocs(narrowPattern, pattern) < 0)
+    if (wstrtocs(narrowPattern, pattern) < 0) {
+        errorText.clear();
         return false;
+    }
     std::string report;
     const bool ok = removeDirectoryContents(narrowDir, narrowPattern, "", report);
     if (!ok)

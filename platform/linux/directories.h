@@ -31,7 +31,8 @@ bool removeDirectoryContents(const std::wstring& dir, std::wstring& errorText);
 bool removeDirectoryAndContents(const std::wstring& dir, std::wstring& errorText);
 
 /// Deletes the plain files of `dir` whose names contain `pattern`. On failure `errorText`
-/// receives the report. A pattern that the locale cannot convert is a failure and deletes nothing.
+/// receives the report. A pattern that the locale cannot convert is a failure with an empty
+/// report, and deletes nothing.
 bool removeFileWithPatternFromDirectory(const std::wstring& dir, const std::wstring& pattern,
                                         std::wstring& errorText);
 

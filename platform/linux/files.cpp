@@ -1,6 +1,7 @@
 #include "platform/linux/files.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "platform/linux/text_source.h"
 #include "platform/linux/wide_output.h"
 #include "platform/linux/wide_strings.h"
 
@@ -80,14 +81,14 @@ bool symlink(const wchar_t* target, const wchar_t* link)
 // Copies text until `in` ends. Returns the message that a failure ends the process with.
 static const char* copyText(FILE* in, FILE* out)
 {
-    static const int PIECE = 1001;
-    wchar_t piece[PIECE];
-    while (fgetws(piece, PIECE, in) != nullptr) {
+    TextSource source(in);
+    std::wstring piece;
+    while (source.readPiece(piece)) {
         if (!putWide(out, piece))
             return "QVMRL0192E: Encountered error copying file contents";
     }
     // Decision: a directory, or bytes that the locale cannot decode, end here.
-    if (feof(in) == 0)
+    if (!source.isAtItsEnd())
         return "QVMRL0193E: Did not encounter EOF while copying file contents";
     // What was written so far is in the stream's buffer; a full disk shows only now.
     if (fflush(out) != 0)
@@ -98,7 +99,7 @@ static const char* copyText(FILE* in, FILE* out)
 bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
 {
     FILE* in = nullptr;
-    open_wfile(in, from, L"r");
+    open_file(in, from, L"r");
     if (in == nullptr) {
         fatalErrorA("QVMRL0190E: Unable to open source file %ls to be copied", from, EXIT_PROCESS,
                     WITH_ERRNO);
@@ -144,6 +145,8 @@ std::wstring placeForNewFile(const std::wstring& target)
     struct stat entry = {};
     if (lstat(narrowTarget.c_str(), &entry) == 0 || errno != ENOENT)
         return target;
+    // What an earlier start left there, or somebody put there as a link, is not written through.
+    unlink((narrowTarget + ".part").c_str());
     return target + L".part";
 }
 

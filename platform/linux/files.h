@@ -70,9 +70,9 @@ void open_wfile(FILE*& fp, const wchar_t* path, const wchar_t* mode);
 /// Opens a path of bytes. `fp` is null on failure.
 void open_prop_file(FILE*& fp, const char* path, const char* mode);
 
-/// One fscanf with `format`, which holds one "%...[" conversion of at most 2024 bytes. `out`
-/// receives the text, and needs room for 2025 characters; it is empty when nothing matched, or
-/// when the locale cannot convert the bytes. A NUL byte ends the text. Returns what fscanf
+/// One fscanf with `format`, which holds at most one conversion, "%...[" of at most 2024 bytes.
+/// `out` receives the text, and needs room for 2025 characters; it is empty when nothing matched,
+/// or when the locale cannot convert the bytes. A NUL byte ends the text. Returns what fscanf
 /// returned: 1, 0 when the conversion did not match, -1 at the end of the file.
 int readFile(FILE* fp, const wchar_t* format, wchar_t* out);
 

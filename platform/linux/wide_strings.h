@@ -1,7 +1,8 @@
-// Raw wide strings and the two conversions between wide text and the locale's bytes.
+// Raw wide strings, and the conversions between wide text and the locale's bytes.
 //
 // Inside the launcher all text is wide. Bytes in the locale's encoding exist at system calls, in
-// files and in the child's words; what crosses that edge goes through the four conversions here.
+// files and in the child's words; what crosses that edge as a whole text goes through the four
+// conversions here.
 // Running out of memory ends the process with a line QVMRL0004E. The conversions may change errno.
 #ifndef PLATFORM_LINUX_WIDE_STRINGS_H
 #define PLATFORM_LINUX_WIDE_STRINGS_H

@@ -156,15 +156,29 @@ TEST(LineBlock, BringsItsLinesIntoTheFileWhenItEnds)
     TempDir dir;
     EXPECT_TRUE(holdsInChild([&] {
         EXPECT_TRUE(enableLogging(dir.wdir));
+        setDebug(true);
         {
             const LineBlock block;
-            fatalErrorA("first", GO_ON, WITHOUT_ERRNO);
-            fatalErrorA("second", GO_ON, WITHOUT_ERRNO);
+            SvcDebugOutA("first");
+            SvcDebugOutA("second");
             EXPECT_EQ(dir.read("velmora.log"), "\n");
         }
         EXPECT_EQ(dir.read("velmora.log"), "\nfirst\nsecond\n");
-        fatalErrorA("third", GO_ON, WITHOUT_ERRNO);
+        SvcDebugOutA("third");
         EXPECT_EQ(dir.read("velmora.log"), "\nfirst\nsecond\nthird\n");
+    }));
+}
+
+TEST(LineBlock, AnErrorLineDoesNotWaitForItsEnd)
+{
+    TempDir dir;
+    EXPECT_TRUE(holdsInChild([&] {
+        EXPECT_TRUE(enableLogging(dir.wdir));
+        setDebug(true);
+        const LineBlock block;
+        SvcDebugOutA("first");
+        fatalErrorA("second", GO_ON, WITHOUT_ERRNO);
+        EXPECT_EQ(dir.read("velmora.log"), "\nfirst\nsecond\n");
     }));
 }
 

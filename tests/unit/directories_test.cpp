@@ -422,3 +422,13 @@ TEST(removeFileWithPatternFromDirectory, MeansEverythingByALoneStar)
     EXPECT_TRUE(removeFileWithPatternFromDirectory(dir.wdir, L"*", errorText));
     EXPECT_EQ(pathsIn(dir.dir), Paths());
 }
+
+TEST(removeFileWithPatternFromDirectory, DecisionPatternThatCannotBeConvertedDeletesNothing)
+{
+    TempDir dir;
+    dir.write("a", "");
+    std::wstring report = L"before";
+    EXPECT_FALSE(removeFileWithPatternFromDirectory(dir.wdir, L"\xd800", report));
+    EXPECT_TRUE(dir.has("a"));
+    EXPECT_EQ(report, L"");
+}

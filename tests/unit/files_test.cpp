@@ -779,3 +779,50 @@ TEST(flushToDisk, IsFalseWhenItCannotBeWrittenOrIsNoDisk)
     EXPECT_EQ(errno, EINVAL);
     fclose(null);
 }
+
+// A copy of `bytes` ends the process since its last character is not whole.
+static testing::AssertionResult endsForACutCharacter(const std::string& bytes)
+{
+    TempDir dir;
+    dir.write("from", bytes);
+    return endsWith([&] { copyFile(dir.wide("from").c_str(), dir.wide("to").c_str()); },
+                    "QVMRL0193E: Did not encounter EOF while copying file contents", EILSEQ);
+}
+
+TEST(copyFile, DecisionACharacterThatTheEndOfTheFileCutsOffEndsTheProcess)
+{
+    EXPECT_TRUE(endsForACutCharacter("good\n\xc3"));
+    EXPECT_TRUE(endsForACutCharacter("good\xe2\x82"));
+    for (const size_t length : {0, 1, 4093, 4094, 4095, 4096, 4097}) {
+        EXPECT_TRUE(endsForACutCharacter(std::string(length, 'a') + "\xc3")) << length;
+        EXPECT_TRUE(endsForACutCharacter(std::string(length, 'a') + "\xf0\x9f\x98")) << length;
+    }
+}
+
+TEST(copyFile, KeepsCharactersThatABufferOfTheStreamDivides)
+{
+    TempDir dir;
+    for (const char* character : {"\xc3\xa4", "\xe2\x82\xac", "\xf0\x9f\x98\x80"}) {
+        for (size_t before = 0; before < 4; ++before) {
+            std::string bytes(before, 'a');
+            for (int i = 0; i < 6000; ++i)
+                bytes += character;
+            dir.write("from", bytes);
+            EXPECT_TRUE(copyFile(dir.wide("from").c_str(), dir.wide("to").c_str()));
+            EXPECT_TRUE(dir.read("to") == bytes) << character << before;
+        }
+    }
+}
+
+TEST(copyNewFile, LinkAtThePlaceAsideIsNotFollowed)
+{
+    TempDir dir;
+    dir.write("from", "text\n");
+    dir.write("victim", "untouched");
+    ASSERT_EQ(::symlink(dir.path("victim").c_str(), dir.path("new.part").c_str()), 0);
+    EXPECT_TRUE(copyNewFile(dir.wide("from").c_str(), dir.wide("new").c_str()));
+    EXPECT_EQ(dir.read("victim"), "untouched");
+    EXPECT_EQ(dir.read("new"), "text\n");
+    EXPECT_FALSE(std::filesystem::is_symlink(dir.path("new")));
+    EXPECT_FALSE(dir.has("new.part"));
+}

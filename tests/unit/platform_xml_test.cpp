@@ -316,9 +316,16 @@ TEST(createPlatformXML, AFailedWriteCutsTheCopyForGood)
 
 TEST(createPlatformXML, LogsAWriteThatFailsOnlyAtTheEnd)
 {
-    const World world("<small>\n");
-    world.dir.makeDir("ws/.config/org.eclipse.update");
-    fs::create_symlink("/dev/full", world.dir.path(std::string(TARGET) + ".part"));
-    EXPECT_EQ(logOf(false, [&] { EXPECT_EQ(world.create(Props({})), 0); }),
-              std::string(NOT_WRITTEN) + "\n");
+    // The whole text fits into the stream's buffer, so only the flush behind it can fail.
+    std::string text;
+    for (int i = 0; i < 20; ++i)
+        text += "<line of twenty one>\n";
+    const World world(text);
+    const Ended ended = runAside(world.dir, false, [&] {
+        limitFileSize(210);
+        return std::to_string(world.create(Props({})));
+    });
+    EXPECT_EQ(ended.result, "0");
+    EXPECT_EQ(ended.log, std::string(NOT_WRITTEN) + "\n");
+    EXPECT_EQ(world.target(), text.substr(0, 210));
 }

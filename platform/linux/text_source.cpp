@@ -1,0 +1,35 @@
+#include "platform/linux/text_source.h"
+
+#include <cerrno>
+
+bool TextSource::readPiece(std::wstring& piece)
+{
+    static const std::wstring::size_type LONGEST = 1000;
+    piece.clear();
+    int byte = 0;
+    while (piece.size() < LONGEST && (byte = getc(file)) != EOF) {
+        const char one = static_cast<char>(byte);
+        wchar_t c = L'\0';
+        const size_t used = mbrtowc(&c, &one, 1, &state);
+        if (used == static_cast<size_t>(-1)) {
+            undecodable = true;
+            return false;
+        }
+        if (used == static_cast<size_t>(-2))
+            continue;
+        piece += c;
+        if (c == L'\n')
+            break;
+    }
+    return !piece.empty() && ferror(file) == 0;
+}
+
+bool TextSource::isAtItsEnd()
+{
+    if (undecodable || feof(file) == 0 || ferror(file) != 0)
+        return false;
+    if (mbsinit(&state) != 0)
+        return true;
+    errno = EILSEQ;
+    return false;
+}
