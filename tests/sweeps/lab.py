@@ -14,7 +14,7 @@ import time
 
 import namespaces
 from world import (APP, BASE, CONFIG, ECLIPSE, HOME, JAVA, LAUNCHER, LOCK, PROPERTIES, RECORDS, USER_PROPERTIES,
-                   WORKSPACE, Platform, executable, lines, read, read_bytes, state, temp_logs, tree, user_logs)
+                   WORKSPACE, Platform, executable, lines, read, read_bytes, state, temp_logs, tree, until, user_logs)
 
 UPDATE = CONFIG + "/org.eclipse.update"
 EXIT_DATA = HOME + "/.exitData"
@@ -249,6 +249,17 @@ class Lab:
                 return file.read().split(" ")[0] in ("73", "143")  # in 64 and in 32 bits
         except OSError:  # gone, or just becoming the launcher
             return False
+
+    def end_behind(self, process):
+        """Ends the platforms while a launcher waits for the lock. It stands still until they are gone: a platform that
+        is just ending lets go of the lock before its number is free, and would still count as running."""
+        os.kill(process.pid, signal.SIGSTOP)
+        for platform in self.records():
+            if platform.alive():
+                os.kill(platform.pid, signal.SIGTERM)
+        numbers = [platform.pid for platform in self.records()]
+        until(lambda: not any(state(number) for number in numbers), "the platforms are gone")
+        os.kill(process.pid, signal.SIGCONT)
 
     # ---- the files
 

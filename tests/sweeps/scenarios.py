@@ -159,7 +159,7 @@ def _start_beside(lab, scenario, living):
     elif not waited:
         problems += _daemon_problems(new[0], living) if new else ["next-start:nothing"]
     if waited:
-        _end_living_platforms(lab)
+        lab.end_behind(process)
     else:
         lab.end_platforms()
     if not process.ended(LONGEST):
@@ -172,13 +172,6 @@ def _start_beside(lab, scenario, living):
         problems.append("next-start:not-main")
     lab.end_platforms()
     return problems, waited
-
-
-def _end_living_platforms(lab):
-    """While a launcher waits for their end."""
-    for platform in lab.records():
-        if platform.alive():
-            platform.end()
 
 
 def follow_up(lab, scenario):

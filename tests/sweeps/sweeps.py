@@ -11,7 +11,7 @@ from lab import TRACE, Lab, hold_still
 from scenarios import SCENARIOS, follow_up, judge_end, prepare, short_for_now
 from world import read
 
-MAIN_BEGINS = re.compile(r'openat\([^,]*, "/dev/null", O_RDWR\)')
+MAIN_BEGINS = re.compile(r'openat\([^,]*, "/dev/null", O_RDWR(\|O_LARGEFILE)?\)')
 
 # The errors that fit a call; those that are not listed cannot fail with any of them.
 PATH_ERRORS = ["ENOENT", "EACCES", "EIO", "ENOMEM"]
@@ -103,6 +103,10 @@ def list_calls(pieces, name):
     """In a world: the calls of an undisturbed start."""
     lab, scenario = enter(pieces), SCENARIOS[name]
     prepare(lab, scenario)
+    return list_calls_of(lab, scenario)
+
+
+def list_calls_of(lab, scenario):
     status, said = lab.run(*scenario.words, strace=["-e", "signal=none"])
     assert (status, said) == (0, "")
     return launcher_calls(read(TRACE))

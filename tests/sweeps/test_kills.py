@@ -5,9 +5,10 @@ import signal
 
 import pytest
 
+import sweeps
 from lab import Lab, hold_still
 from scenarios import SCENARIOS, mains, prepare
-from world import LAUNCHER, executable, until
+from world import LAUNCHER, WORKSPACE, executable, until
 
 # Whoever executes a program waits a little before; the tracer is no child of the test.
 SLOW_EXEC = ["-D", "-f", "-e", "trace=execve", "-e", "inject=execve:delay_enter=400000"]
@@ -36,9 +37,32 @@ def _killed_with_a_child(pieces, name, strace):
     waited = not second.ended()
     until(lab.records, "the child runs")
     alone = len(lab.records()) == 1 and not second.ended()
-    lab.records()[0].end()
+    lab.end_behind(second)
     until(second.ended, "the other start has ended")
     return waited, alone, second.status, len(mains(lab.platforms()))
+
+
+def _workspace_made_meanwhile(pieces):
+    """In a world: a first start, and somebody who makes its workspace after it has found none."""
+    hold_still()
+    lab, scenario = Lab(pieces), SCENARIOS["first"]
+    prepare(lab, scenario)
+    calls = [call for call in sweeps.list_calls_of(lab, scenario) if call.name == "mkdir"]
+    last = next(call for call in calls if call.path() == WORKSPACE)
+    lab.reset()
+    delay = "inject=mkdir:delay_enter=300000:when=%d" % last.number
+    start = lab.start(strace=["-e", "trace=mkdir", "-e", delay])
+    until(lambda: os.path.isdir(os.path.dirname(WORKSPACE)), "it makes the folders above")
+    os.mkdir(WORKSPACE)
+    until(start.ended, "it has ended")
+    lines = lab.last_lines()
+    return start.status, [line.partition(" : ")[0] for line in lines], lab.run()[0]
+
+
+def test_a_workspace_that_another_start_makes_meanwhile(in_a_world):
+    """Required as it is: whether it is there is asked before it is made. The next start works."""
+    assert in_a_world(_workspace_made_meanwhile) == (
+        255, ["QVMRL0083E: Unable to create %s directory." % WORKSPACE], 0)
 
 
 @pytest.mark.parametrize("name, strace", [("first", SLOW_EXEC), ("second", SLOW_EXEC), ("provisioning", None)],
