@@ -4,6 +4,7 @@
 #include "platform/linux/argument_vector.h"
 
 #include <cwchar>
+#include <cwctype>
 
 static bool hasOption(const wchar_t* option, int argc, wchar_t** argv)
 {
@@ -56,11 +57,16 @@ void doVersionCheck(int argc, wchar_t** argv)
 // The number that follows "-maxargcnt"; 0 when none does.
 static unsigned long declaredCount(int option, int argc, wchar_t** argv)
 {
+    if (option + 1 >= argc)
+        return 0;
+    const wchar_t* number = argv[option + 1];
+    while (iswspace(static_cast<wint_t>(*number)) != 0)
+        ++number;
     // Decision: a number with a minus sign is none. The C library would turn it into a large one,
     // and which that is depends on the width.
-    if (option + 1 >= argc || wcschr(argv[option + 1], L'-') != nullptr)
+    if (*number == L'-')
         return 0;
-    return wcstoul(argv[option + 1], nullptr, 10);
+    return wcstoul(number, nullptr, 10);
 }
 
 void validateIfUrlHandlerLaunch(int argc, wchar_t** argv)

@@ -441,6 +441,7 @@ TEST(setPreload, EndsForALibraryWithoutADirectory)
     EXPECT_TRUE(endsWith(
         [&] {
             fs::current_path(dir.dir);
+            unsetenv("USER");
             errno = EACCES;
             setPreload(L"a b.so", L"1234");
         },

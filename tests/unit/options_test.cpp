@@ -250,8 +250,17 @@ TEST(validateNoJavaLibraryPath, AcceptsEverythingElse)
 TEST(validateIfUrlHandlerLaunch, DecisionANumberWithAMinusSignIsNone)
 {
     // Four, once taken modulo the width: 2^64 - (2^64 - 4) and 2^32 - (2^32 - 4).
-    for (const wchar_t* count : {L"-18446744073709551612", L"-4294967292", L"-4"}) {
+    for (const wchar_t* count : {L"-18446744073709551612", L"-4294967292", L"-4",
+                                 L" -18446744073709551612", L"\t-4294967292"}) {
         Line line({L"velmora", L"-maxargcnt", count, L"a"});
         EXPECT_FATAL(validateIfUrlHandlerLaunch(line.argc, line.argv), "QVMRL0069E");
+    }
+}
+
+TEST(validateIfUrlHandlerLaunch, TakesTheDigitsThatTheWordBeginsWith)
+{
+    for (const wchar_t* count : {L"4", L"+4", L" 4", L"04", L"4x", L"4-x", L"4 -5"}) {
+        Line line({L"velmora", L"-maxargcnt", count, L"a"});
+        EXPECT_EQ(logOf(false, [&] { validateIfUrlHandlerLaunch(line.argc, line.argv); }), "");
     }
 }

@@ -202,6 +202,11 @@ TEST(addMainOptionsToCommandLine, EndsWithoutAnInstallId)
         "QVMRL0005E: Couldn't find the rcp.install.id property!", EACCES));
 }
 
+TEST(addMainOptionsToCommandLine, MissesTheInstallIdBeforeTheLocationsDo)
+{
+    EXPECT_FATAL(mainOptions(Line({L"velmora"}), {}, {}), "QVMRL0005E");
+}
+
 static Texts systemProperties(std::initializer_list<const wchar_t*> userProps,
                               std::initializer_list<const wchar_t*> launcherProps,
                               int configuration = CONFIG_USER)
@@ -267,6 +272,11 @@ TEST(addDashDToCommandLine, EndsWithoutAnInstallId)
             systemProperties({}, {L"rcp.data", L"/ws", L"rcp.install.id", L"1"});
         },
         "QVMRL0036E: Couldn't find the rcp.install.id property!", EACCES));
+}
+
+TEST(addDashDToCommandLine, MissesTheInstallIdBeforeTheConfigurationsName)
+{
+    EXPECT_FATAL(systemProperties({}, {L"rcp.data", L"/ws"}, CONFIG_OTHER), "QVMRL0036E");
 }
 
 TEST(addDashDToCommandLine, TracesEachWordThatAPropertyGives)
