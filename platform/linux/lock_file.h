@@ -8,7 +8,8 @@
 //   .sid        stands while a platform runs; left over, the last session ended uncleanly
 //
 // The first launcher holds an exclusive advisory lock (flock, see its man page) on .rcp.lock from
-// locateLockFile until its platform has been executed and recorded; later launchers wait for it.
+// locateLockFile until its platform has been executed and recorded (a provisioning run: until that
+// has ended); later launchers wait for it.
 // The role is decided once, in lockLockFile.
 #ifndef PLATFORM_LINUX_LOCK_FILE_H
 #define PLATFORM_LINUX_LOCK_FILE_H

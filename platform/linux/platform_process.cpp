@@ -54,9 +54,10 @@ static std::string platformTest(long pid, const std::wstring& exeName)
 bool isPlatformAlive(long pid, const std::wstring& exeName)
 {
     // A number that no process can have is a dead one, also where pid_t is narrower than long.
-    // Neither for it nor without a name could the shell find anything but an error to print.
+    // Neither for 0 nor without a name could the shell find anything but an error to print. A
+    // negative number is looked up like any other: ps takes it for a session.
     std::string name;
-    if (pid <= 0 || pid > INT_MAX || wstrtocs(name, exeName) <= 0)
+    if (pid == 0 || pid > INT_MAX || pid < -INT_MAX || wstrtocs(name, exeName) <= 0)
         return false;
     if (kill(static_cast<pid_t>(pid), 0) != 0 && errno == ESRCH)
         return false;

@@ -6,7 +6,7 @@
 
 /// True when the process `pid` lives and the shell finds `exeName`, a pattern for grep, in the
 /// line that ps prints for it. False also when the shell or ps cannot be run, for a number that no
-/// process has, and without a name.
+/// process has, without a name, and with one that the locale cannot convert.
 bool isPlatformAlive(long pid, const std::wstring& exeName);
 
 #endif

@@ -93,7 +93,8 @@ const wchar_t* chartowstr(const char* s, std::wstring& out)
     return out.c_str();
 }
 
-// Decision: text that the locale cannot convert becomes an empty word, wherever it goes.
+// Decision: text that the locale cannot convert becomes an empty word: in paths, the log and the
+// child's words. What is written to a file is transliterated (wide_output.h).
 static int convert(std::string& out, const wchar_t* s)
 {
     out.clear();

@@ -457,7 +457,7 @@ def test_a_failed_fork_outside_of_a_kiosk(world):
     assert not os.path.exists(MAIN)
 
 
-FAILED = "QVMRL0194E: Executing launcher failed! : "
+FAILED = "QVMRL0194E: Executing launcher failed! : No such file or directory\n"
 
 
 def test_a_platform_that_cannot_be_executed(world):

@@ -7,7 +7,7 @@ from world import (BASE, ECLIPSE, HEAD, HOME, INSTALL_AREA, LOCK, LOG, MAIN, STA
 EXIT_DATA = HOME + "/.exitData"
 REQUEST = "/tmp/tzn_shutdown"
 PLATFORM = HEAD + areas() + STARTUP + system(configuration="lockdown") + INSTALL_AREA
-FAILED = "QVMRL0194E: Executing launcher failed! : "
+FAILED = "QVMRL0194E: Executing launcher failed! : No such file or directory\n"
 # The child that failed flushes its streams while the launcher is about to write into the lock file, between two seeks.
 AT_ONCE = ["-P", LOCK, "-P", EXIT_DATA, "-e", "trace=open,openat,lseek,_llseek", "-e",
            "inject=open,openat:delay_enter=50000", "-e", "inject=lseek,_llseek:delay_exit=150000"]

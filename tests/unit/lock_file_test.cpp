@@ -27,7 +27,8 @@ static const wchar_t* const NAME = L"fake-platform";
 
 // A process that ps shows under `name`, until it is killed or its seconds are over.
 struct Platform {
-    explicit Platform(const std::string& name = "fake-platform", int seconds = 600)
+    explicit Platform(const std::string& name = "fake-platform", int seconds = 600,
+                      bool ownSession = false)
     {
         int executed[2] = {-1, -1};
         if (pipe2(executed, O_CLOEXEC) != 0)
@@ -36,6 +37,8 @@ struct Platform {
         pid = fork();
         if (pid == 0) {
             prctl(PR_SET_PDEATHSIG, SIGKILL);
+            if (ownSession)
+                setsid();
             execl("/bin/sleep", name.c_str(), time.c_str(), nullptr);
             _exit(127);
         }
@@ -941,4 +944,12 @@ TEST(isMainProcessRunning, LeavesNothingThatAChildCouldSetBack)
     EXPECT_EQ(lseek(fd, 0, SEEK_CUR), before);
     populateLockFile(1234);
     EXPECT_EQ(dir.read(".rcp.lock"), "1234             ");
+}
+
+TEST(isMainProcessRunning, NegativeNumberIsLookedUpLikeAnyOther)
+{
+    // kill takes it for a process group, ps for a session; both are this platform's own.
+    Platform platform("fake-platform", 600, true);
+    EXPECT_EQ(roleWith("-" + platform.number()), DAEMON);
+    EXPECT_EQ(roleWith("-" + platform.number(), L"another-name"), MAIN);
 }

@@ -271,6 +271,8 @@ TEST(getProperties, ContinuationOfAnXLineIsOneToo)
 {
     EXPECT_EQ(read("-Xa:\\\n  :b\nc:d\n"), Texts({L"-Xa", L"::b", L"c", L"d"}));
     EXPECT_EQ(read("a:b\\\n-X:c\n"), Texts({L"a", L"b-X:c"}));
+    // A separator that is kept is no character of the value that would end the continuing.
+    EXPECT_EQ(read("-Xa\\\n=\nb\n"), Texts({L"-Xa", L"=b"}));
 }
 
 TEST(getProperties, LineOfOneCharacterLeavesTheMarkOfTheLineBefore)

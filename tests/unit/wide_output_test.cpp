@@ -72,3 +72,14 @@ TEST(putWide, SaysThatTheDiskIsFull)
     EXPECT_FALSE(putWide(full, std::wstring(100000, L'x')));
     fclose(full);
 }
+
+TEST(putWide, TransliteratesASurrogateInUtf8Too)
+{
+    const TempDir dir;
+    for (const size_t before : {0, 300, 600}) {
+        const std::wstring text = std::wstring(before, L'x') + L"a\xd800" + L"b\n";
+        EXPECT_TRUE(putInto(dir, L"w", text));
+        EXPECT_EQ(dir.read("out"), wideStreamOutput(dir, text));
+        EXPECT_EQ(dir.read("out"), std::string(before, 'x') + "a?b\n");
+    }
+}
