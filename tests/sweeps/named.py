@@ -34,7 +34,6 @@ def _logged(*numbers):
 
 RENEWING = ("reset", "renewal")
 OPENING = ("open", "openat")
-DISTURBED = ("errors", "kills", "memory")
 
 NAMED = (
     Named("platform-not-seen",
@@ -94,10 +93,6 @@ NAMED = (
           "The shared .eclipseextension is copied in its place, by every start.",
           "After a kill at that moment it is short until the next start copies it.",
           r"short-for-now:applications/eclipse/\.eclipseextension", ("kills",), path=r".*/\.eclipseextension"),
-    Named("history-line-cut",
-          "The history of starts is appended to, piece by piece.",
-          "One line of shutdown.log is cut short. Nothing but the count of lines depends on it.",
-          r"short:logs/shutdown\.log", DISTURBED),
     Named("saved-copies-left",
           "A reset saves the update registry and the bookmarks in the workspace, where they stay when it comes to its "
           "end before it has put them back.",

@@ -27,6 +27,7 @@ ERRORS = {
     "wait4": ["EINTR"], "waitpid": ["EINTR"],
     "clock_nanosleep": ["EINTR"], "clock_nanosleep_time64": ["EINTR"],
     "getrandom": ["EINTR"],
+    "getcwd": ["ENOENT", "EACCES", "ENOMEM"],
     "pipe2": ["EMFILE", "ENOMEM"],
     "dup": ["EMFILE"], "dup2": ["EMFILE"], "dup3": ["EMFILE"],
     "mmap": ["ENOMEM", "EACCES"], "mmap2": ["ENOMEM", "EACCES"],

@@ -1,4 +1,4 @@
-"""Kills at moments at which no call of the launcher begins: it stands still, and its child runs."""
+"""Moments that no sweep meets by itself: the launcher stands still, and its child or another launcher goes on."""
 
 import os
 import signal
@@ -8,7 +8,7 @@ import pytest
 import sweeps
 from lab import Lab, hold_still
 from scenarios import SCENARIOS, mains, prepare
-from world import LAUNCHER, WORKSPACE, executable, until
+from world import LAUNCHER, LOCK, LOG, WORKSPACE, executable, read, read_bytes, until
 
 # Whoever executes a program waits a little before; the tracer is no child of the test.
 SLOW_EXEC = ["-D", "-f", "-e", "trace=execve", "-e", "inject=execve:delay_enter=400000"]
@@ -63,6 +63,28 @@ def test_a_workspace_that_another_start_makes_meanwhile(in_a_world):
     """Required as it is: whether it is there is asked before it is made. The next start works."""
     assert in_a_world(_workspace_made_meanwhile) == (
         255, ["QVMRL0083E: Unable to create %s directory." % WORKSPACE], 0)
+
+
+def _log_shared(pieces):
+    """In a world: a launcher that is about to write its last line, and another one that begins the log anew."""
+    hold_still()
+    lab, scenario = Lab(pieces), SCENARIOS["first"]
+    prepare(lab, scenario)
+    last = [call for call in sweeps.list_calls_of(lab, scenario) if call.name == "write" and call.path() == LOG][-1]
+    lab.reset()
+    delay = "inject=write:delay_enter=700000:when=%d" % last.number
+    first = lab.start(strace=["-e", "trace=write", "-e", delay])
+    platform = until(lab.records, "the platform runs")[0]
+    until(lambda: read(LOCK).startswith("%d " % platform.pid), "it is recorded")
+    place = len(read_bytes(LOG))
+    second = lab.run()
+    until(first.ended, "the first one has written its last line")
+    return first.status, second, read_bytes(LOG)[place:place + 32]
+
+
+def test_a_log_that_another_launcher_begins_anew(in_a_world):
+    """Required as it is: the last line comes after the lock was released, and stands where the first log ended."""
+    assert in_a_world(_log_shared) == (0, (0, ""), b"QVMRL0306I: lock file released @")
 
 
 @pytest.mark.parametrize("name, strace", [("first", SLOW_EXEC), ("second", SLOW_EXEC), ("provisioning", None)],
