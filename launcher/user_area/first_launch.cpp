@@ -14,6 +14,6 @@ void makeUserDirectory(const std::wstring& dir, const char* message)
     if (isDirectory(path.c_str()))
         return;
     userFirstLaunch = true;
-    if (!mkdirs(path.c_str()))
+    if (!ensureDirectory(path.c_str()))
         fatalErrorA(message, path.c_str(), EXIT_PROCESS, WITH_ERRNO);
 }

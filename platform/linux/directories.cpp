@@ -1,6 +1,7 @@
 #include "platform/linux/directories.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "platform/linux/files.h"
 #include "platform/linux/wide_strings.h"
 
 #include <cerrno>
@@ -29,6 +30,18 @@ bool mkdirs(const wchar_t* path)
         at = parts.find_first_not_of(L"/\\", end);
     }
     return made;
+}
+
+// Decision: asked again after a failure. Of several first starts at once another may have made the
+// directory meanwhile; each of them comes to the lock that orders them.
+bool ensureDirectory(const wchar_t* path)
+{
+    if (mkdirs(path))
+        return true;
+    const int reason = errno;
+    const bool stands = isDirectory(path);
+    errno = reason;
+    return stands;
 }
 
 // Adds "<what><path>  - <reason>" to the report.

@@ -12,6 +12,10 @@ bool createDirectory(const wchar_t* path);
 /// that exists: ask isDirectory first. True for a path without parts.
 bool mkdirs(const wchar_t* path);
 
+/// mkdirs; true also when it failed because a directory stands there by now. Otherwise errno is that
+/// of mkdirs.
+bool ensureDirectory(const wchar_t* path);
+
 /// Removes from `dir` every entry when `pattern` is exactly "*", sub-directories with all they
 /// hold included; otherwise the plain files of `dir` itself whose names contain `pattern`. Links
 /// are followed. Goes on after every failure and adds a line to `report` for each, in the order

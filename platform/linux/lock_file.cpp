@@ -140,7 +140,9 @@ void unlockLockFile()
 // Writes `text` over the start of the lock file. False when it did not get there.
 static bool rewriteLockFile(const std::string& text)
 {
-    rewind(lockFILE);
+    // Anywhere else than at its start the number would stand behind the old one, and not be found.
+    if (fseek(lockFILE, 0, SEEK_SET) != 0)
+        return false;
     const bool written = fputs(text.c_str(), lockFILE) >= 0;
     return fflush(lockFILE) == 0 && written;
 }

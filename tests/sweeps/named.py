@@ -115,12 +115,6 @@ NAMED = (
           "What cannot be removed of an old backup that was moved aside is left without a word.",
           ".configbakdeleteme0001 to 0005 stay until a later reset removes them.",
           r"left(-short)?:\.configbakdeleteme000[1-5](/.*)?", ("errors", "kills"), RENEWING),
-    Named("workspace-made-by-another",
-          "Whether the workspace is there is asked before it is made, without a lock, and one that cannot be made because it "
-          "is there by now is a failure.",
-          "Of several first starts within a millisecond one may end with QVMRL0083E. Its line is in /tmp, until another "
-          "start removes that log, as it must. Its user starts it again.",
-          "end:255 (QVMRL0083E)?", ("crowds",), when=lambda case: not case["again"]),
     Named("log-shared",
           "velmora.log is begun anew by each launcher, and the last line of each is written after the lock was released.",
           "The last line of one launcher may stand in the middle of the next one's log, with zero bytes before it.",

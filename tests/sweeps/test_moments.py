@@ -60,9 +60,9 @@ def _workspace_made_meanwhile(pieces):
 
 
 def test_a_workspace_that_another_start_makes_meanwhile(in_a_world):
-    """Required as it is: whether it is there is asked before it is made. The next start works."""
-    assert in_a_world(_workspace_made_meanwhile) == (
-        255, ["QVMRL0083E: Unable to create %s directory." % WORKSPACE], 0)
+    """Of several first starts at once each comes to the lock, whoever makes the folders."""
+    status, _, next_status = in_a_world(_workspace_made_meanwhile)
+    assert (status, next_status) == (0, 0)
 
 
 def _log_shared(pieces):

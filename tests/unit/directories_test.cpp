@@ -432,3 +432,30 @@ TEST(removeFileWithPatternFromDirectory, DecisionPatternThatCannotBeConvertedDel
     EXPECT_TRUE(dir.has("a"));
     EXPECT_EQ(report, L"");
 }
+
+TEST(ensureDirectory, MakesEveryLevel)
+{
+    TempDir dir;
+    EXPECT_TRUE(ensureDirectory(dir.wide("a/b").c_str()));
+    EXPECT_TRUE(std::filesystem::is_directory(dir.path("a/b")));
+}
+
+TEST(ensureDirectory, DecisionOneThatStandsThereByNowIsAsGood)
+{
+    TempDir dir;
+    dir.makeDir("a");
+    EXPECT_TRUE(ensureDirectory(dir.wide("a").c_str()));
+}
+
+TEST(ensureDirectory, FailsWhereAFileOrALinkStands)
+{
+    TempDir dir;
+    dir.write("file", "");
+    dir.makeDir("a");
+    ASSERT_EQ(symlink(dir.path("a").c_str(), dir.path("link").c_str()), 0);
+    for (const char* name : {"file", "link"}) {
+        errno = 0;
+        EXPECT_FALSE(ensureDirectory(dir.wide(name).c_str()));
+        EXPECT_EQ(errno, EEXIST);
+    }
+}

@@ -953,3 +953,23 @@ TEST(isMainProcessRunning, NegativeNumberIsLookedUpLikeAnyOther)
     EXPECT_EQ(roleWith("-" + platform.number()), DAEMON);
     EXPECT_EQ(roleWith("-" + platform.number(), L"another-name"), MAIN);
 }
+
+// The call by which a stream goes to its start.
+#ifdef SYS__llseek
+static const long SEEK_CALL = SYS__llseek;
+#else
+static const long SEEK_CALL = SYS_lseek;
+#endif
+
+TEST(populateLockFile, WritesNothingWhereTheStartCannotBeFound)
+{
+    TempDir dir;
+    EXPECT_TRUE(holdsInChild([&] {
+        locate(dir.wdir);
+        populateLockFile(123456);
+        ASSERT_TRUE(makeFail(SEEK_CALL, EIO));
+        EXPECT_EQ(linesOf(false, [] { populateLockFile(7); }),
+                  "QVMRL0051E: Unable to write to platform lock file\n");
+    }));
+    EXPECT_EQ(dir.read(".rcp.lock"), "123456          ");
+}
