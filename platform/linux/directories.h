@@ -12,8 +12,8 @@ bool createDirectory(const wchar_t* path);
 /// that exists: ask isDirectory first. True for a path without parts.
 bool mkdirs(const wchar_t* path);
 
-/// mkdirs; true also when it failed because a directory stands there by now. Otherwise errno is that
-/// of mkdirs.
+/// mkdirs; true also when it failed because a directory stands there by now. Otherwise errno is
+/// that of mkdirs.
 bool ensureDirectory(const wchar_t* path);
 
 /// Removes from `dir` every entry when `pattern` is exactly "*", sub-directories with all they
