@@ -10,6 +10,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cwchar>
 
 // Where the options stand that are not passed on like any other word, -1 for the absent ones.
 // Only the first occurrence of each counts.
@@ -125,7 +126,8 @@ static std::wstring systemProperty(const wchar_t* key, const wchar_t* value)
 {
     std::wstring word;
     setArgProperty(word, key, value);
-    return word.c_str();
+    word.resize(wcslen(word.c_str()));
+    return word;
 }
 
 void addDashDToCommandLine(const PropertyList& props, const PropertyList& launcherProps, int argc,

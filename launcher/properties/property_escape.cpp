@@ -12,7 +12,7 @@ void addHexDigits(std::wstring& out, unsigned code)
 
 static void appendEscaped(wchar_t c, const wchar_t* special, std::wstring& out)
 {
-    const auto code = static_cast<unsigned>(c);
+    const unsigned code = std::char_traits<wchar_t>::to_int_type(c);
     if (code < 0x20 || code >= 0x7f) {
         out += L"\\u";
         addHexDigits(out, code);
