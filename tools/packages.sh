@@ -24,8 +24,9 @@ package_group() {
         sanitizers) echo "g++ g++-multilib" ;;
         coverage) echo "gcovr" ;;
         valgrind) echo "valgrind" ;;
-        fuzz) echo "clang llvm" ;;
+        fuzz) echo "clang llvm locales" ;;
         pages) echo "python3 python3-pytest mandoc man-db desktop-file-utils appstream" ;;
+        bench) echo "cmake g++ g++-multilib valgrind strace procps dash default-jdk-headless|openjdk-17-jdk-headless" ;;
         packaging) echo "dpkg-dev binutils file lintian debootstrap" ;;
         *)
             echo "packages.sh: there is no package group \"$1\"" >&2

@@ -18,8 +18,13 @@ struct Ended {};
 /// something to clean up relies on that. What those callers hold is lost.
 extern bool endsByJump;
 
+/// How often the shell still finds a platform, whatever number is looked up; never unless a target
+/// says otherwise. One that lived for ever would have a restart wait for ever, where its number
+/// stands so far behind in the lock file that invalidating does not reach it.
+extern int platformLooks;
+
 /// Runs `action`; true when it came to its end, false when the launcher ended the process with a
-/// status that it may have (0, 1, 255). Any other status, and any line on standard output, is a
+/// status that it may have (0, 1, 255). Any other status, and any byte on standard output, is a
 /// finding. Streams that the action left open are closed.
 bool runs(const std::function<void()>& action);
 

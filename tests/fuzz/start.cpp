@@ -90,9 +90,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
     std::filesystem::permissions(home() + "/base/linux/x86/eclipse",
                                  std::filesystem::perms::owner_all, ignored);
     putInHome("rcp/deploy/jvm.properties", bytes.rest());
+    platformLooks = (flags & 32) != 0 ? 50 : 0;
     const int argc = static_cast<int>(argv.size());
-    if (runs([&] { startup(argc, argv.data(), launchArgs); }) && launchArgs.empty() &&
-        (flags & 16) == 0 && !startsJvmDirectly())
+    const bool came = runs([&] {
+        startup(argc, argv.data(), launchArgs);
+        freeExecArguments(newExecArguments(launchArgs, "begin", "end"));
+    });
+    if (came && launchArgs.empty() && (flags & 16) == 0 && !startsJvmDirectly())
         finding("a start that came to its end without a command");
     return 0;
 }
