@@ -49,18 +49,24 @@ void readsymln(std::string& out, const char* link)
     out.assign(target, static_cast<size_t>(length));
 }
 
+// Asked once: the system makes a directory in /proc for the answer, which takes longer than opening
+// five files.
+static const char* ownExecutable()
+{
+    static std::string path;
+    if (path.empty())
+        readsymln(path, OWN_EXECUTABLE);
+    return path.c_str();
+}
+
 void getLauncherPath(std::wstring& out, const wchar_t* /*ignored*/)
 {
-    std::string target;
-    readsymln(target, OWN_EXECUTABLE);
-    chartowstr(target.c_str(), out);
+    chartowstr(ownExecutable(), out);
 }
 
 void findCommand(wchar_t*& dir, const wchar_t* /*ignored*/)
 {
-    std::string target;
-    readsymln(target, OWN_EXECUTABLE);
-    dir = chartowcs(target.c_str());
+    dir = chartowcs(ownExecutable());
     wchar_t* slash = wcsrchr(dir, L'/');
     if (slash != nullptr)
         *slash = L'\0';

@@ -243,3 +243,29 @@ TEST(watchChildren, DecisionThePlatformInheritsTheDefault)
     ASSERT_EQ(ignored.compare(0, 8, "SigIgn:\t"), 0) << ignored;
     EXPECT_EQ(std::stoull(ignored.substr(8), nullptr, 16) >> (SIGCHLD - 1) & 1, 0u) << ignored;
 }
+
+TEST(startChild, LeavesEachSignalAsItIs)
+{
+    TempDir dir;
+    EXPECT_TRUE(holdsInChild([&] {
+        signal(SIGHUP, SIG_IGN);
+        signal(SIGPIPE, SIG_DFL);
+        const ChildStart start =
+            started({"/bin/sh", "-c", "grep -E 'Sig(Blk|Ign):' /proc/self/status >\"$0\"",
+                     dir.path("out")});
+        EXPECT_EQ(statusOf(start.pid), 0);
+    }));
+    EXPECT_EQ(dir.read("out"), "SigBlk:\t0000000000000000\nSigIgn:\t0000000000000001\n");
+}
+
+TEST(startChild, AProgramThatIsRefusedLeavesNoChildBehindButTheOneThatSaysSo)
+{
+    TempDir dir;
+    EXPECT_TRUE(holdsInChild([&] {
+        ASSERT_TRUE(enableLogging(dir.wdir));
+        const ChildStart start = started({dir.path("no")});
+        EXPECT_EQ(statusOf(start.pid), CAME_BACK);
+        EXPECT_EQ(waitpid(-1, nullptr, 0), -1);
+        EXPECT_EQ(errno, ECHILD);
+    }));
+}

@@ -144,6 +144,37 @@ TEST(truncateShutdownLog, LongerLineCountsInPieces)
               history(100, 197) + longest + "\n" + longest + "\ny\n");
 }
 
+TEST(truncateShutdownLog, WhiteSpaceBehindALineBelongsToItsEnd)
+{
+    const std::string blanks = " \t\n\v\f\r\n  ";
+    EXPECT_EQ(truncated(history(1, 198) + blanks + "Started 199\n" + blanks),
+              history(1, 198) + blanks + "Started 199\n" + blanks);
+    EXPECT_EQ(truncated(history(1, 199) + blanks + "Started 200\n" + blanks), history(100, 200));
+    // The blanks behind a line's first 2024 bytes, too.
+    const std::string longest(2024, 'x');
+    EXPECT_EQ(truncated(history(1, 198) + longest + " \t\n"), history(1, 198) + longest + " \t\n");
+    EXPECT_EQ(truncated(history(1, 198) + longest + " \ty\n"),
+              history(100, 198) + longest + "\ny\n");
+}
+
+TEST(truncateShutdownLog, BlanksAtTheHeadAreALine)
+{
+    EXPECT_EQ(truncated(" \n" + history(1, 198)), " \n" + history(1, 198));
+    EXPECT_EQ(truncated(" \n" + history(1, 199)), history(99, 199));
+    EXPECT_EQ(truncated(std::string("\0", 1) + "\n" + history(1, 199)), history(99, 199));
+}
+
+TEST(truncateShutdownLog, CountsOverTheBlocksThatAreRead)
+{
+    // Lines of 41 bytes with their ends, so that a line end falls on each place of a block.
+    std::string lines;
+    for (int i = 0; i < 199; ++i)
+        lines += std::string(40, 'x') + "\n";
+    EXPECT_EQ(truncated(lines), lines);
+    EXPECT_EQ(truncated(lines + "y").substr(0, 41), std::string(40, 'x') + "\n");
+    EXPECT_EQ(truncated(lines + "y").size(), 100 * 41 + 2u);
+}
+
 TEST(truncateShutdownLog, BytesAreTheLocales)
 {
     std::string lines;
