@@ -1,6 +1,7 @@
 #include "platform/linux/files.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "diag/narrow.h"
 #include "platform/linux/text_source.h"
 #include "platform/linux/wide_output.h"
 #include "platform/linux/wide_strings.h"
@@ -24,13 +25,7 @@ bool exists(const wchar_t* path)
 
 bool existsA(const char* path)
 {
-    if (path == nullptr)
-        return false;
-    const int fd = open(path, O_RDONLY | O_CLOEXEC);
-    if (fd < 0)
-        return false;
-    close(fd);
-    return true;
+    return path != nullptr && fileExists(path);
 }
 
 bool isDirectory(const wchar_t* path)
@@ -237,7 +232,7 @@ int readFile(FILE* fp, const wchar_t* format, wchar_t* out)
     const int result = fscanf(fp, narrowFormat(format), work);
     // Decision: a read that matched nothing hands over an empty line, and so do bytes that the
     // locale cannot convert.
-    if (mbstowcs(out, work, LINE_ROOM) >= LINE_ROOM)
+    if (decode(out, work, LINE_ROOM) >= LINE_ROOM)
         out[0] = L'\0';
     return result;
 }

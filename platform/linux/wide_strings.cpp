@@ -4,7 +4,9 @@
 
 #include <climits>
 #include <cstdlib>
+#include <cstring>
 #include <cwchar>
+#include <langinfo.h>
 
 static wchar_t* allocate(size_t n)
 {
@@ -46,13 +48,47 @@ wchar_t* initMemString(wchar_t* dst, const wchar_t* src)
     return wcscat(dst, src);
 }
 
+// ASCII stands for itself in the encodings that nearly every session has. A text of nothing else
+// is converted without the C library, which takes ten times as long for it.
+static bool asciiIsItself()
+{
+    const char* encoding = nl_langinfo(CODESET);
+    return strcmp(encoding, "UTF-8") == 0 || strcmp(encoding, "ANSI_X3.4-1968") == 0;
+}
+
+size_t decode(wchar_t* out, const char* s, size_t room)
+{
+    const bool shortWay = asciiIsItself();
+    for (size_t i = 0; shortWay && static_cast<unsigned char>(s[i]) < 0x80; ++i) {
+        if (i == room)
+            return room;
+        out[i] = static_cast<wchar_t>(s[i]);
+        if (s[i] == '\0')
+            return i;
+    }
+    return mbstowcs(out, s, room);
+}
+
+static size_t encode(char* out, const wchar_t* s, size_t room)
+{
+    const bool shortWay = asciiIsItself();
+    for (size_t i = 0; shortWay && s[i] >= 0 && s[i] < 0x80; ++i) {
+        if (i == room)
+            return room;
+        out[i] = static_cast<char>(s[i]);
+        if (s[i] == L'\0')
+            return i;
+    }
+    return wcstombs(out, s, room);
+}
+
 // What the locale makes of `s`: in `near` when it fits there, so that most texts are converted just
 // once. Returns the number of characters, 0 also for bytes that the locale cannot convert.
 static const size_t NEAR = 512;
 
 static size_t convertNear(const char* s, wchar_t (&near)[NEAR], bool& fits)
 {
-    size_t length = mbstowcs(near, s, NEAR);
+    size_t length = decode(near, s, NEAR);
     fits = length < NEAR;
     if (length == NEAR)
         length = mbstowcs(nullptr, s, 0);
@@ -70,7 +106,7 @@ static wchar_t* fillWide(wchar_t* block, const char* s, const wchar_t (&near)[NE
     if (fits)
         wmemcpy(block, near, length + 1);
     else
-        mbstowcs(block, s, length + 1);
+        decode(block, s, length + 1);
     return block;
 }
 
@@ -99,7 +135,7 @@ static int convert(std::string& out, const wchar_t* s)
 {
     out.clear();
     char near[NEAR];
-    size_t count = wcstombs(near, s, NEAR);
+    size_t count = encode(near, s, NEAR);
     // With less room left than a character may need, the text may have been cut before one.
     if (count < NEAR - MB_LEN_MAX) {
         out.assign(near, count);
@@ -114,7 +150,7 @@ static int convert(std::string& out, const wchar_t* s)
         fatalErrorA("QVMRL0004E: malloc failed!", EXIT_PROCESS, WITH_ERRNO);
         return -1;
     }
-    count = wcstombs(buffer, s, length);
+    count = encode(buffer, s, length);
     out.assign(buffer, length - 1);
     free(buffer);
     return static_cast<int>(count);

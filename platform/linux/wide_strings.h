@@ -23,6 +23,9 @@ wchar_t* freeString(void* p);
 /// Appends `src` to `dst` and returns `dst`. On a fresh string this is a copy.
 wchar_t* initMemString(wchar_t* dst, const wchar_t* src);
 
+/// mbstowcs into `out`, which is not null.
+size_t decode(wchar_t* out, const char* s, size_t room);
+
 /// A new string (the caller owns it) with the text of `s`. Bytes that the locale cannot convert
 /// make the whole result empty.
 wchar_t* chartowcs(const char* s);

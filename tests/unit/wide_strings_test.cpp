@@ -94,6 +94,37 @@ TEST(initMemString, DeliberatelyAppends)
     freeString(text);
 }
 
+TEST(decode, FillsTheRoomAndNoMore)
+{
+    const wchar_t untouched = L'#';
+    for (const char* bytes : {"abc", "ab\xc3\xa9"}) {
+        const std::wstring text = bytes[2] == 'c' ? L"abc" : L"ab\u00e9";
+        for (size_t room = 0; room <= 5; ++room) {
+            wchar_t out[6] = {untouched, untouched, untouched, untouched, untouched, untouched};
+            EXPECT_EQ(decode(out, bytes, room), room < 3 ? room : 3) << bytes << room;
+            for (size_t i = 0; i < 6; ++i) {
+                const wchar_t behind = i == 3 && room > 3 ? L'\0' : untouched;
+                EXPECT_EQ(out[i], i < 3 && i < room ? text[i] : behind) << bytes << room << i;
+            }
+        }
+    }
+}
+
+TEST(decode, RefusesWhatTheLocaleCannotConvertWhereverItStands)
+{
+    wchar_t out[8];
+    const auto refused = static_cast<size_t>(-1);
+    EXPECT_EQ(decode(out, "\x80", 8), refused);
+    EXPECT_EQ(decode(out, "ab\xff", 8), refused);
+    EXPECT_EQ(decode(out, "ab\xff", 2), 2u);
+    EXPECT_TRUE(holdsInChild([&] {
+        setlocale(LC_CTYPE, "C");
+        EXPECT_EQ(decode(out, "ab\xc3\xa9", 8), refused);
+        EXPECT_EQ(decode(out, "ab\x7f", 8), 3u);
+        EXPECT_EQ(std::wstring(out), L"ab\x7f");
+    }));
+}
+
 TEST(chartowcs, ConvertsTheLocalesBytes)
 {
     wchar_t* text = chartowcs("a\xc3\xa9\xe2\x82\xac\xf0\x9f\x98\x80z");
@@ -189,24 +220,30 @@ TEST(wcstochar, DeliberatelyTakesFourTimesTheCountedLength)
         holdsInChild([] { EXPECT_EQ(convertedWithin(24), std::string(4 * MEGABYTE, 'a')); }));
 }
 
-// Texts on both sides of 512, beyond which a text does not fit into the converters' own memory, with
-// a character of four bytes, or one that cannot be converted, at the end.
+// There and back, by each of the four.
+static void expectConverted(const std::string& bytes, const std::wstring& text)
+{
+    std::wstring wide = L"before";
+    chartowstr(bytes.c_str(), wide);
+    EXPECT_EQ(wide, text) << text.size();
+    wchar_t* block = chartowcs(bytes.c_str());
+    EXPECT_EQ(block, text) << text.size();
+    freeString(block);
+    std::string narrow = "before";
+    EXPECT_EQ(wstrtocs(narrow, text), static_cast<int>(bytes.size()));
+    EXPECT_EQ(narrow, bytes) << text.size();
+    wcstochar(narrow, text.c_str());
+    EXPECT_EQ(narrow, bytes) << text.size();
+}
+
+// Texts on both sides of 512, beyond which a text does not fit into the converters' own memory:
+// ASCII alone, and with a character of four bytes, or one that cannot be converted, at the end.
 TEST(conversions, AreTheSameForTextsOfEveryLength)
 {
     for (size_t length = 480; length < 530; ++length) {
-        const std::string bytes = std::string(length, 'a') + "\xf0\x9f\x98\x80";
-        const std::wstring text = std::wstring(length, L'a') + L'\U0001f600';
-        std::wstring wide = L"before";
-        chartowstr(bytes.c_str(), wide);
-        EXPECT_EQ(wide, text) << length;
-        wchar_t* block = chartowcs(bytes.c_str());
-        EXPECT_EQ(block, text) << length;
-        freeString(block);
-        std::string narrow = "before";
-        EXPECT_EQ(wstrtocs(narrow, text), static_cast<int>(length + 4));
-        EXPECT_EQ(narrow, bytes) << length;
-        wcstochar(narrow, text.c_str());
-        EXPECT_EQ(narrow, bytes) << length;
+        expectConverted(std::string(length, 'a'), std::wstring(length, L'a'));
+        expectConverted(std::string(length, 'a') + "\xf0\x9f\x98\x80",
+                        std::wstring(length, L'a') + L'\U0001f600');
     }
 }
 
