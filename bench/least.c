@@ -1,9 +1,9 @@
 /*
- * The least that a warm start takes: a dynamic C program in the user's locale that touches the
- * files which a warm start has to, each of them once, understands none of them, and starts the
- * platform.
+ * The least that a start takes: a dynamic C program in the user's locale that touches the files
+ * which a start has to, each of them once, understands none of them, and starts the platform.
  *
- *     least APP WORKSPACE PROGRAM
+ *     least APP WORKSPACE PROGRAM          a warm start
+ *     least APP WORKSPACE PROGRAM first    makes the user area
  */
 #define _GNU_SOURCE
 #include <fcntl.h>
@@ -13,8 +13,11 @@
 #include <stdlib.h>
 #include <string.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <time.h>
 #include <unistd.h>
+
+#define BASE "rcp/eclipse/plugins/base/"
 
 enum { PIECE = 4096 };
 
@@ -36,16 +39,16 @@ static int opened(const char* path, int flags)
     return fd;
 }
 
-/* Reads it all, and has it in wide characters. */
+/* Reads it to its end, which the last piece does not tell, and has it in wide characters. */
 static void read_text(const char* path)
 {
     int fd = opened(path, O_RDONLY);
-    ssize_t length;
-    while ((length = read(fd, text, PIECE)) > 0) {
-        text[length] = 0;
-        if (mbstowcs(wide, text, PIECE) == (size_t)-1)
-            exit(1);
-    }
+    ssize_t length = read(fd, text, PIECE);
+    if (length < 0 || length == PIECE)
+        exit(1);
+    text[length] = 0;
+    if (read(fd, wide, 1) != 0 || mbstowcs(wide, text, PIECE) == (size_t)-1)
+        exit(1);
     close(fd);
 }
 
@@ -69,6 +72,54 @@ static void look(const char* path)
         return;
 }
 
+static void make(const char* path)
+{
+    if (mkdir(path, 0775) != 0)
+        exit(1);
+}
+
+static void make_folders(const char* area)
+{
+    const char* folders[] = {"logs",
+                             ".config",
+                             ".config/org.eclipse.update",
+                             "applications",
+                             "applications/eclipse",
+                             "applications/eclipse/features",
+                             "applications/eclipse/plugins"};
+    char path[PIECE];
+    snprintf(path, sizeof path, "%s", area);
+    const char* home = getenv("HOME");
+    for (char* end = path + strlen(home ? home : "") + 1; (end = strchr(end, '/')); end++) {
+        *end = 0;
+        make(path);
+        *end = '/';
+    }
+    make(path);
+    for (size_t i = 0; i < sizeof folders / sizeof *folders; i++)
+        make(below(area, folders[i]));
+}
+
+/* Whole, and on the disk, before it is there. */
+static void copy(const char* from, const char* area, const char* name)
+{
+    char whole[PIECE], part[PIECE + 5];
+    snprintf(whole, sizeof whole, "%s/.config/%s", area, name);
+    snprintf(part, sizeof part, "%s.part", whole);
+    read_text(from);
+    int fd = opened(part, O_WRONLY | O_CREAT | O_TRUNC);
+    put(fd, text);
+    if (fsync(fd) != 0 || close(fd) != 0 || rename(part, whole) != 0)
+        exit(1);
+}
+
+static void make_copies(const char* app, const char* area)
+{
+    copy(below(app, BASE "config.ini"), area, "config.ini");
+    copy(below(app, BASE "rcpinstall.properties"), area, "rcpinstall.properties");
+    copy(below(app, BASE "platform.xml"), area, "org.eclipse.update/platform.xml");
+}
+
 static pid_t start(const char* program)
 {
     pid_t child = vfork();
@@ -79,25 +130,29 @@ static pid_t start(const char* program)
     return child;
 }
 
-/* What was there before the start: the installation and the lock. */
-static int begin(const char* app, const char* area)
+/* Up to the lock, which names a platform that is no more, or none. */
+static int begin(const char* app, const char* area, int first)
 {
     if (readlink("/proc/self/exe", text, PIECE) < 0)
         exit(1);
     read_text(below(app, "rcp/velmora.properties"));
     look(below(app, "rcp/prov.debug/debug.txt"));
     look(area);
-    int lock = opened(below(area, ".rcp.lock"), O_RDWR);
-    if (flock(lock, LOCK_EX) != 0 || read(lock, text, PIECE) < 1 || kill(atoi(text), 0) == 0)
+    if (first)
+        make_folders(area);
+    int lock = opened(below(area, ".rcp.lock"), O_RDWR | O_CREAT);
+    if (flock(lock, LOCK_EX) != 0 || (read(lock, text, PIECE) > 0) == first)
+        exit(1);
+    if (!first && kill(atoi(text), 0) == 0)
         exit(1);
     look(below(area, ".sid"));
     return lock;
 }
 
-static int prepare(const char* app, const char* area)
+static int prepare(const char* app, const char* area, int first)
 {
     look(below(area, "logs"));
-    int log = opened(below(area, "logs/velmora.log"), O_WRONLY | O_TRUNC);
+    int log = opened(below(area, "logs/velmora.log"), O_WRONLY | O_CREAT | O_TRUNC);
     look("/tmp/velmora.log");
     look(below(area, ".config"));
     look(below(area, "applications/eclipse/features"));
@@ -105,6 +160,8 @@ static int prepare(const char* app, const char* area)
     look(below(app, "shared/eclipse/.eclipseextension"));
     write_text(below(area, ".config/args.properties"), O_TRUNC, "arg0=velmora\n");
     look(below(area, ".config/config.ini"));
+    if (first)
+        make_copies(app, area);
     read_text(below(area, ".config/rcpinstall.properties"));
     read_text(below(area, ".config/args.properties"));
     read_text(below(app, "rcp/eclipse/plugins/velmora.demo.jvm/jvm.properties"));
@@ -119,16 +176,17 @@ static int prepare(const char* app, const char* area)
 
 int main(int argc, char** argv)
 {
-    if (argc != 4 || !setlocale(LC_CTYPE, ""))
+    if (argc < 4 || !setlocale(LC_CTYPE, ""))
         return 1;
     const char *app = argv[1], *area = argv[2];
-    int lock = begin(app, area), log = prepare(app, area);
+    int first = argc > 4;
+    int lock = begin(app, area, first), log = prepare(app, area, first);
     pid_t child = start(argv[3]);
     if (child < 0)
         return 1;
-    snprintf(text, sizeof text, "%-11ld", (long)child);
+    ssize_t length = snprintf(text, sizeof text, "%ld          ", (long)child);
     write_text(below(area, ".rcp.main"), O_TRUNC, text);
-    if (pwrite(lock, text, 11, 0) != 11 || flock(lock, LOCK_UN) != 0)
+    if (pwrite(lock, text, (size_t)length, 0) != length || flock(lock, LOCK_UN) != 0)
         return 1;
     put(log, "The lock is released.\n");
     return 0;

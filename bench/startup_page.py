@@ -41,14 +41,15 @@ def label(result, name):
 
 def times_table(result):
     rows = [["a start", "to the child, ms", "times the limit (quartiles)", "to its own end, ms",
-             "times the limit (quartiles)", "processor time, ms", "peak memory, KB"]]
+             "times the limit (quartiles)", "processor time, ms", "peak memory, KB", "page faults"]]
     for name, start in result["starts"].items():
         to_child = ["", ""]
         if None not in start["to_child"]:
             to_child = [figure(median(result, name, "to_child")), shown_ratio(result, name, "to_child")]
         rows.append([label(result, name), *to_child,
                      figure(median(result, name, "to_exit")), shown_ratio(result, name, "to_exit"),
-                     figure(median(result, name, "cpu")), figure(int(median(result, name, "resident")))])
+                     figure(median(result, name, "cpu")), figure(int(median(result, name, "resident"))),
+                     figure(int(median(result, name, "faults")))])
     return table(*rows)
 
 
@@ -86,11 +87,11 @@ def targets(result):
     """Each target: its key, what it says, the bound, the figure of each build, and that of the least, or None."""
     def times(name, limit="limit", what="to_child", least=None):
         return (lambda build: ratio(result, "%s-%s" % (build, name), what, limit.replace("BUILD", build)),
-                least and (lambda build: ratio(result, "least-" + build, what, limit)))
+                least and (lambda build: ratio(result, "least-%s-%s" % (build, name), what, limit)))
 
     def count(key):
         figures = result["counts"]
-        return (lambda build: figures[build + "-warm"][key]), (lambda build: figures["least-" + build][key])
+        return (lambda build: figures[build + "-warm"][key]), (lambda build: figures["least-%s-warm" % build][key])
 
     def memory(name):
         return int(median(result, name, "resident"))
@@ -100,7 +101,7 @@ def targets(result):
 
     return [
         ("warm", "a warm start to the child, times the limit", 1.5, *times("warm", least=True)),
-        ("first", "a first start to the child, times the limit", 2.0, *times("first")),
+        ("first", "a first start to the child, times the limit", 2.0, *times("first", least=True)),
         ("fatal", "a fatal end to its end, times a warm start's", 1.0, *times("fatal", "BUILD-warm", "to_exit")),
         ("beside", "beside a running platform to the child, times the limit after `ps` and `grep`", 1.15,
          *times("beside", "limit-ps")),
@@ -110,9 +111,9 @@ def targets(result):
         ("calls", "a warm start's system calls", 120, *count("calls")),
         ("instructions", "a warm start's instructions", 1500000, *count("instructions")),
         ("memory", "a warm start's peak memory, KB", 4096, lambda build: memory(build + "-warm"),
-         lambda build: memory("least-" + build)),
+         lambda build: memory("least-%s-warm" % build)),
         ("libraries", "a warm start's shared libraries, beside the loader", 1,
-         lambda build: libraries(build + "-warm"), lambda build: libraries("least-" + build)),
+         lambda build: libraries(build + "-warm"), lambda build: libraries("least-%s-warm" % build)),
         ("helpers", "a warm start's helper processes", 0, *count("helpers")),
     ]
 
@@ -152,7 +153,7 @@ def tables(result):
     if "disk" in result:
         texts += [disk_table(result), "Flushing costs %s.\n" % flush_price(result)]
     if "counts" in result and {"native-warm", "native-first", "native-fatal", "limit-ps", "dash",
-                               "jpackage", "least-native"} <= set(result["starts"]):
+                               "jpackage", "least-native-warm"} <= set(result["starts"]):
         texts.append(targets_table(result))
     return "\n".join(texts)
 

@@ -70,7 +70,9 @@ def parts(launchers):
     with tempfile.TemporaryDirectory() as name:
         folder = pathlib.Path(name)
         for target, (source, words) in COMPILED.items():
-            subprocess.run([compiler, *STRICT, *words, "-o", target, str(HERE / source)], cwd=folder, check=True)
+            if subprocess.run([compiler, *STRICT, *words, "-o", target, str(HERE / source)], cwd=folder,
+                              check=False).returncode != 0:
+                sys.exit("error: %s could not be compiled" % source)
         files = {target: (folder / target).read_bytes() for target in COMPILED}
         files["naive.sh"] = (HERE / "naive.sh").read_bytes()
         return {"launchers": {build: pathlib.Path(path).read_bytes() for build, path in launchers.items()},

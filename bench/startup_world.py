@@ -185,20 +185,22 @@ class Start(Contestant):
 
 
 class Least(Contestant):
-    """A program that only touches the files of a warm start, in a user area of velmora's."""
+    """A program that only touches the files of a start; its warm starts are in a user area of velmora's."""
 
-    def __init__(self, build):
-        self.warm = Start(build, "warm", name="least-" + build)
-        super().__init__(self.warm.name, "dynamic C program, a warm start's files",
-                         [PARTS + "/least-" + build, "/mnt/%s/app" % build, self.warm.workspace,
-                          "/mnt/%s/app" % build + ECLIPSE])
+    def __init__(self, build, scenario):
+        self.start = Start(build, scenario, name="least-%s-%s" % (build, scenario))
+        app = "/mnt/%s/app" % build
+        super().__init__(self.start.name, "dynamic C program, the files of %s" % SCENARIOS[scenario],
+                         [PARTS + "/least-" + build, app, self.start.workspace, app + ECLIPSE])
+        if scenario == "first":
+            self.command.append("first")
 
     def prepare(self):
-        self.warm.prepare()
+        self.start.prepare()
 
     def check(self, words):
         super().check(words)
-        if not pathlib.Path(self.warm.workspace, "logs", "velmora.log").read_text().endswith("released.\n"):
+        if not pathlib.Path(self.start.workspace, "logs", "velmora.log").read_text().endswith("released.\n"):
             raise Failed("%s: it did not come to its end" % self.name)
 
 
@@ -235,7 +237,7 @@ class World:
             Contestant("limit", "static C program: fork, exec", [PARTS + "/limit", child]),
             Contestant("floor-native", "dynamic C program, locale set", [PARTS + "/floor-native", child]),
             Contestant("floor-i686", "dynamic C program, locale set", [PARTS + "/floor-i686", child]),
-            Least("native"), Least("i686"),
+            *(Least(build, scenario) for scenario in ("first", "warm") for build in ("native", "i686")),
             Script("dash", "dash script, four settings", ["/mnt/native/app/rcp/naive.sh"]),
             JavaLauncher("jpackage", "`jpackage` launcher, no package tool on PATH", ["/mnt/java/bin/platform"],
                          PATH="/mnt/no-tools"),
@@ -250,7 +252,8 @@ class World:
 
     @staticmethod
     def measure(contestant):
-        """One start: milliseconds to the child (or None) and to the end, processor time in milliseconds, KB."""
+        """One start: milliseconds to the child (or None) and to the end, processor time in milliseconds, KB,
+        faults."""
         contestant.prepare()
         for name in os.listdir("/tmp"):
             remove("/tmp/" + name)
@@ -259,13 +262,13 @@ class World:
                              contestant.env, result)
         told = os.pread(result, 4096, 0).split()
         os.close(result)
-        if (status, said, len(told)) != (0, "", 7):
+        if (status, said, len(told)) != (0, "", 8):
             raise Failed("%s: %d %s" % (contestant.name, status, said))
-        child, end, cpu, resident, ended, left, failed = map(int, told)
+        child, end, cpu, resident, faults, ended, left, failed = map(int, told)
         words = arrival()[8:].decode().split("\0")[:-1]
         if (ended, left, failed, child >= 0) != (contestant.status, contestant.left, 0, contestant.arrives):
             raise Failed("%s: status %d, %d processes left, %d failed, arrival %d" % (
                 contestant.name, ended, left, failed, child))
         contestant.check(words)
         return {"to_child": child / 1e6 if child >= 0 else None, "to_exit": end / 1e6, "cpu": cpu / 1e3,
-                "resident": resident}
+                "resident": resident, "faults": faults}

@@ -6,8 +6,9 @@
  * PROGRAM gets WORD... as its words. What it starts tells its arrival in STAMP; whatever of it is
  * left behind comes to this process and is waited for. Written to the descriptor RESULT, on one
  * line: the nanoseconds from PROGRAM's exec to the stamp (-1 when there was none) and to the
- * program's end, the microseconds of processor time and the peak of its resident memory in KB,
- * both with those of its helpers, its status, how many were left behind, and which of them failed.
+ * program's end, the microseconds of processor time, the peak of its resident memory in KB and
+ * the page faults, all with those of its helpers, its status, how many were left behind, and how
+ * many of these failed.
  *
  * Linked statically: a process begins with the memory of its maker as its peak.
  */
@@ -86,9 +87,10 @@ int main(int argc, char** argv)
         failed += other != 0;
     }
     struct stamp stamp = read_stamp();
-    dprintf(result, "%ld %ld %ld %ld %d %d %d\n",
+    dprintf(result, "%ld %ld %ld %ld %ld %d %d %d\n",
             stamp.nanoseconds ? stamp.nanoseconds - *begin : -1, end - *begin,
             microseconds(usage.ru_utime) + microseconds(usage.ru_stime), usage.ru_maxrss,
-            WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status), left, failed);
+            usage.ru_minflt, WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status), left,
+            failed);
     return 0;
 }

@@ -17,7 +17,8 @@ BENCH = ROOT / "bench"
 LAUNCHERS = {build: ROOT / "build" / build / "velmora" for build in ("native", "i686")}
 SCENARIOS = ["first", "warm", "daily", "beside", "fatal"]
 VELMORA = [build + "-" + scenario for build in LAUNCHERS for scenario in SCENARIOS]
-OTHERS = ["limit", "limit-ps", "floor-native", "floor-i686", "least-native", "least-i686", "dash", "jpackage"]
+OTHERS = ["limit", "limit-ps", "floor-native", "floor-i686", "least-native-first", "least-i686-first",
+          "least-native-warm", "least-i686-warm", "dash", "jpackage"]
 
 sys.dont_write_bytecode = True
 sys.path[:0] = [str(BENCH), str(ROOT / "tests" / "sweeps")]
@@ -59,7 +60,7 @@ def test_everything_is_started_in_every_round(result):
     assert sorted(result["starts"]) == sorted(VELMORA + OTHERS)
     assert sorted(result["disk"]) == ["disk-disk", "disk-flushed", "disk-memory"]
     for name, start in {**result["starts"], **result["disk"]}.items():
-        for key in ("to_child", "to_exit", "cpu", "resident"):
+        for key in ("to_child", "to_exit", "cpu", "resident", "faults"):
             assert len(start[key]) == 2, (name, key)
         arrives = not name.endswith("-fatal")
         assert all((value is not None and value > 0) == arrives for value in start["to_child"]), name
