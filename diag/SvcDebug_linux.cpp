@@ -9,6 +9,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
+#include <fcntl.h>
 #include <unistd.h>
 
 // A formatted line and its terminating zero; a longer one is cut.
@@ -272,6 +273,9 @@ bool enableLogging(const std::wstring& dir)
         return false;
     }
     fwide(logFILE, -1);
+    // Somebody else may have put a FIFO there: what it does not take is lost, and nobody waits.
+    if (dir == L"/tmp")
+        fcntl(fileno(logFILE), F_SETFL, O_NONBLOCK);
     fprintf(logFILE, "%s\n", logque.c_str());
     fflush(logFILE);
     logque.clear();

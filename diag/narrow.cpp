@@ -1,7 +1,9 @@
 #include "diag/narrow.h"
 
-#include <cstdio>
+#include <cerrno>
 #include <cstdlib>
+#include <fcntl.h>
+#include <unistd.h>
 
 std::string narrow(const wchar_t* text)
 {
@@ -29,9 +31,13 @@ std::string narrowPath(const std::wstring& path)
 
 bool fileExists(const char* path)
 {
-    FILE* file = fopen(path, "rbe");
-    if (file == nullptr)
+    // A FIFO opens at once: in /tmp anybody could put one there, for everybody's starts to wait at.
+    int fd = open(path, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    // Where somebody holds a lease on the file, only a patient open has it given up.
+    if (fd < 0 && errno == EWOULDBLOCK)
+        fd = open(path, O_RDONLY | O_CLOEXEC);
+    if (fd < 0)
         return false;
-    fclose(file);
+    close(fd);
     return true;
 }

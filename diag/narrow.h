@@ -14,7 +14,7 @@ std::wstring withSlashes(std::wstring path);
 /// The path as this system takes it, with slashes, in bytes.
 std::string narrowPath(const std::wstring& path);
 
-/// True when the file can be opened for reading.
+/// True when the file can be opened for reading. Never waits for the other end of a FIFO.
 bool fileExists(const char* path);
 
 #endif

@@ -10,7 +10,7 @@
 // ---- Questions: false for a null path ----------------------------------------------------------
 
 /// True when the file can be opened for reading: one that may not be read counts as absent, a
-/// directory as present.
+/// directory as present. Never waits for the other end of a FIFO.
 bool exists(const wchar_t* path);
 bool existsA(const char* path);
 

@@ -39,10 +39,12 @@ bool shutdown()
 {
     umask(0);
     // One that stands there is opened as it is: some systems refuse to create what another user has
-    // created in /tmp, though everybody may write to it.
-    int fd = open(CMD_FILE, O_WRONLY | O_TRUNC | O_CLOEXEC);
+    // created in /tmp, though everybody may write to it. A FIFO there that nobody reads is no place
+    // for a request, and no reason to wait.
+    const int mode = O_WRONLY | O_TRUNC | O_NONBLOCK | O_CLOEXEC;
+    int fd = open(CMD_FILE, mode);
     if (fd < 0)
-        fd = open(CMD_FILE, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+        fd = open(CMD_FILE, mode | O_CREAT, 0666);
     if (fd < 0)
         return false;
     // "shutdown" and its zero at offset 0, "1" and its zero at offset 256, zeros elsewhere.

@@ -745,6 +745,31 @@ TEST(dumpLogToTempLocation, IsFalseWhenTheFileCannotBeOpened)
     }));
 }
 
+TEST(dumpLogToTempLocation, LosesWhatAFifoDoesNotTakeInsteadOfWaiting)
+{
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        ASSERT_EQ(mkfifo("/tmp/velmora.log", 0600), 0);
+        addcstr_to_logque(std::string(1 << 20, 'x').c_str());
+        EXPECT_TRUE(dumpLogToTempLocation());
+        const int fd = open("/tmp/velmora.log", O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+        char taken[8] = "";
+        EXPECT_EQ(read(fd, taken, 7), 7);
+        EXPECT_STREQ(taken, "xxxxxxx");
+        close(fd);
+    }));
+}
+
+TEST(deleteTempLog, DoesNotWaitForTheOtherEndOfAFifo)
+{
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        ASSERT_EQ(mkfifo("/tmp/velmora.log", 0600), 0);
+        deleteTempLog();
+        EXPECT_FALSE(fs::exists("/tmp/velmora.log"));
+    }));
+}
+
 TEST(deleteTempLog, DeletesThePlainTemporaryLogAlone)
 {
     NEEDS_PRIVATE_TMP();

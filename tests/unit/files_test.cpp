@@ -4,6 +4,7 @@
 #include "tests/unit/support.h"
 
 #include <cerrno>
+#include <csignal>
 #include <cwchar>
 #include <fcntl.h>
 #include <filesystem>
@@ -82,6 +83,35 @@ TEST(exists, IsFalseForAFileThatMayNotBeRead)
         EXPECT_FALSE(exists(dir.wide("file").c_str()));
         EXPECT_FALSE(existsA(dir.path("file").c_str()));
     }));
+}
+
+TEST(exists, IsTrueForAFifoWithoutWaitingForItsOtherEnd)
+{
+    TempDir dir;
+    ASSERT_EQ(mkfifo(dir.path("fifo").c_str(), 0600), 0);
+    EXPECT_TRUE(exists(dir.wide("fifo").c_str()));
+    EXPECT_TRUE(existsA(dir.path("fifo").c_str()));
+}
+
+static int leased = -1;
+
+static void giveUpTheLease(int)
+{
+    fcntl(leased, F_SETLEASE, F_UNLCK);
+}
+
+TEST(exists, WaitsUntilALeaseOnTheFileIsGivenUp)
+{
+    TempDir dir;
+    dir.write("file", "");
+    EXPECT_EQ(statusOf([&] {
+                  signal(SIGIO, giveUpTheLease);
+                  leased = open(dir.path("file").c_str(), O_RDWR | O_CLOEXEC);
+                  EXPECT_EQ(fcntl(leased, F_SETLEASE, F_WRLCK), 0);
+                  EXPECT_TRUE(existsA(dir.path("file").c_str()));
+                  EXPECT_EQ(fcntl(leased, F_GETLEASE), F_UNLCK);
+              }),
+              0);
 }
 
 TEST(isDirectory, IsTrueForADirectoryItselfAlone)

@@ -316,6 +316,33 @@ TEST(shutdown, IsFalseWithoutALogoffWhenTheRequestCannotBeWritten)
     }));
 }
 
+TEST(shutdown, DoesNotWaitForSomebodyWhoReadsTheRequest)
+{
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        Session session;
+        ASSERT_EQ(mkfifo(CMD_FILE, 0666), 0);
+        EXPECT_EQ(answerOf(session, shutdown), NO);
+        EXPECT_EQ(session.killed(), "");
+    }));
+}
+
+TEST(shutdown, HandsTheRequestToWhoeverReadsAFifo)
+{
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        Session session;
+        ASSERT_EQ(mkfifo(CMD_FILE, 0666), 0);
+        const int reader = open(CMD_FILE, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+        ASSERT_GE(reader, 0);
+        EXPECT_EQ(answerOf(session, shutdown), 1);
+        std::string record(600, 'x');
+        EXPECT_EQ(read(reader, &record[0], record.size()), 512);
+        EXPECT_EQ(record.substr(0, 512), shutdownRecord());
+        close(reader);
+    }));
+}
+
 TEST(shutdown, KillsTheGnomeSessionWithoutTheLibraryAfterTheRequest)
 {
     NEEDS_PRIVATE_TMP();
