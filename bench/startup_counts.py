@@ -9,7 +9,7 @@ import os
 import pathlib
 import re
 
-from startup_world import ECLIPSE, Failed, remove, spawn
+from startup_world import ECLIPSE, Failed, remove, watched
 
 TRACE = "/dev/shm/trace"
 PROFILE = "/dev/shm/profile"
@@ -19,9 +19,9 @@ LIBRARY = re.compile(r'open(?:at)?\(.*"([^"]*/[^"/]+\.so(?:\.[0-9]+)*)".* = [0-9
 def run(contestant, tool):
     """A start under a tool."""
     contestant.prepare()
-    status, said = spawn([*tool, *contestant.command], contestant.env)
-    if (status, said) != (contestant.status, ""):
-        raise Failed("%s under %s: %d %s" % (contestant.name, tool[0], status, said))
+    ended, _, failed = watched(contestant, [*tool, *contestant.command])[5:]
+    if (ended, failed) != (contestant.status, 0):
+        raise Failed("%s under %s: status %d, %d failed" % (contestant.name, tool[0], ended, failed))
 
 
 def calls(contestant):

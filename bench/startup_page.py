@@ -64,6 +64,12 @@ def counts_table(result):
     return table(*rows)
 
 
+def guarded(count):
+    """The counts that are the same from start to start, but for very little."""
+    return {"calls": count["calls"], "instructions": count["instructions"], "libraries": len(count["libraries"]),
+            "helpers": count["helpers"]}
+
+
 def disk_table(result):
     disk = result["disk"]
     titles = {"disk-memory": "in memory, not flushed", "disk-disk": "on the disk, not flushed",

@@ -85,6 +85,17 @@ def spawn(command, env, *descriptors):
     return status, text
 
 
+def watched(contestant, command):
+    """What the stopwatch says of the command, after which nothing of it is left."""
+    result = os.memfd_create("result")
+    status, said = spawn([PARTS + "/stopwatch", str(result), command[0], *command], contestant.env, result)
+    told = os.pread(result, 4096, 0).split()
+    os.close(result)
+    if (status, said, len(told)) != (0, "", 8):
+        raise Failed("%s: %d %s" % (contestant.name, status, said))
+    return list(map(int, told))
+
+
 class Contestant:
     """One kind of start: its command, and what must have come of it."""
     status = 0
@@ -252,19 +263,11 @@ class World:
 
     @staticmethod
     def measure(contestant):
-        """One start: milliseconds to the child (or None) and to the end, processor time in milliseconds, KB,
-        faults."""
+        """One start: milliseconds to the child (or None) and to the end, processor time in milliseconds, KB, faults."""
         contestant.prepare()
         for name in os.listdir("/tmp"):
             remove("/tmp/" + name)
-        result = os.memfd_create("result")
-        status, said = spawn([PARTS + "/stopwatch", str(result), contestant.command[0], *contestant.command],
-                             contestant.env, result)
-        told = os.pread(result, 4096, 0).split()
-        os.close(result)
-        if (status, said, len(told)) != (0, "", 8):
-            raise Failed("%s: %d %s" % (contestant.name, status, said))
-        child, end, cpu, resident, faults, ended, left, failed = map(int, told)
+        child, end, cpu, resident, faults, ended, left, failed = watched(contestant, contestant.command)
         words = arrival()[8:].decode().split("\0")[:-1]
         if (ended, left, failed, child >= 0) != (contestant.status, contestant.left, 0, contestant.arrives):
             raise Failed("%s: status %d, %d processes left, %d failed, arrival %d" % (

@@ -25,7 +25,7 @@
 #include <time.h>
 #include <unistd.h>
 
-enum { LONGEST = 60 };
+enum { LONGEST = 60 }; /* seconds */
 
 static long now(void)
 {

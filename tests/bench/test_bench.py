@@ -1,4 +1,4 @@
-"""bench/startup measures what it says, and bench/report believes nothing else.
+"""bench/startup measures what it says, bench/report believes nothing else, and the counts stay what the page shows.
 
 Takes build/native/velmora and build/i686/velmora; no time is looked at.
 """
@@ -81,6 +81,14 @@ def test_helpers_and_libraries_are_known(result):
         assert [path.rpartition("/")[2] for path in result["counts"][name]["libraries"]] == ["libc.so.6"], name
     assert result["counts"]["limit"]["libraries"] == []
     assert [result["counts"][name]["helpers"] for name in ("limit", "limit-ps")] == [0, 3]
+
+
+@pytest.mark.parametrize("name", VELMORA)
+def test_the_counts_stay(result, name):
+    """Ten in a hundred more than at the time of the page are allowed."""
+    known = json.loads((BENCH / "counts.json").read_text())[name]
+    found = startup_page.guarded(result["counts"][name])
+    assert {key: value for key, value in found.items() if value > 1.1 * known[key]} == {}
 
 
 def test_what_the_tables_need_is_kept(result):
