@@ -25,7 +25,7 @@ package_group() {
         coverage) echo "gcovr" ;;
         valgrind) echo "valgrind" ;;
         fuzz) echo "clang llvm locales" ;;
-        pages) echo "python3 python3-pytest mandoc man-db desktop-file-utils appstream" ;;
+        pages) echo "python3 python3-pytest cmake mandoc man-db desktop-file-utils appstream systemd" ;;
         bench) echo "cmake g++ g++-multilib valgrind strace procps dash default-jdk-headless|openjdk-17-jdk-headless" ;;
         packaging) echo "dpkg-dev binutils file lintian debootstrap" ;;
         *)

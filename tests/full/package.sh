@@ -159,6 +159,9 @@ PLATFORM
             /lib/systemd/system/velmora-kiosk@.service; do
             [ -s "$file" ] || { echo "$file"; exit 1; }
         done'
+    try "$a: no page leads to one that was not installed" in_root bash -c '
+        cd /usr/share/doc/velmora && pages=$(grep -oh "](.[^)#:]*)" ./*.md | sed "s/^](//; s/)$//" | sort -u) && [ -n "$pages" ] &&
+        for page in $pages; do [ -s "$page" ] || { echo "$page"; exit 1; }; done'
     try "$a: ps is there, which it depends on" in_root sh -c 'command -v ps && dpkg-query -W -f="\${Depends}" velmora | grep procps'
     try "$a: a start without a platform says what is missing" start_without_platform
     add_platform
@@ -220,6 +223,7 @@ cmp packaging/home/velmora.properties "$home/rcp/velmora.properties"
 [ "$(ls "$home" | tr '\n' ' ')" = "open-link rcp share " ]
 [ "$(ls "$home/rcp" | tr '\n' ' ')" = "deploy eclipse velmora velmora.properties " ]
 [ "$(ls "$home/share" | tr '\n' ' ')" = "doc man " ]
+cmp LICENSE "$home/share/doc/velmora/LICENSE"
 # It finds itself from there.
 status=0
 HOME=$scratch USER=anna LC_ALL=C.UTF-8 "$home/rcp/velmora" || status=$?
@@ -300,6 +304,21 @@ no_path_of_this_machine() { # PACKAGE
     ! grep -aF "$ROOT" "$scratch/usr/lib/velmora/rcp/velmora"
 }
 
+# The rcp home in one folder, with its licence and without what belongs to a distribution.
+tarball_is() { # FILE CLASS
+    local folder=$scratch/tarball
+    rm -rf "$folder" && mkdir "$folder" && tar -xzf "$1" -C "$folder" || return
+    local inside="${1##*/}"
+    inside=${inside%.tar.gz}
+    (cd "$folder" && printf '%s\n' * "$inside"/*) |
+        diff <(printf '%s\n' "$inside" "$inside"/{open-link,rcp,share}) - || return
+    folder=$folder/$inside
+    [ "$(readelf -h "$folder/rcp/velmora" | sed -n 's/^ *Class: *//p')" = "$2" ] || return
+    cmp LICENSE "$folder/share/doc/velmora/LICENSE" &&
+        cmp packaging/home/velmora.properties "$folder/rcp/velmora.properties" &&
+        [ -s "$folder/share/man/man1/velmora.1.gz" ] && [ -x "$folder/open-link" ] && [ -d "$folder/rcp/eclipse/plugins" ]
+}
+
 refuses() {
     ! "$@"
 }
@@ -353,8 +372,10 @@ for architecture in amd64 i386; do
     try "$architecture: the control file says so" field_is "$deb" Architecture "$architecture"
     if [ "$architecture" = amd64 ]; then
         try "$architecture: its executable is of that architecture" executable_is "$deb" ELF64 "Advanced Micro Devices X86-64"
+        try "$architecture: the tarball is whole" tarball_is "$(ls "$debs"/velmora-*-x86_64.tar.gz)" ELF64
     else
         try "$architecture: its executable is of that architecture" executable_is "$deb" ELF32 "Intel 80386"
+        try "$architecture: the tarball is whole" tarball_is "$(ls "$debs"/velmora-*-i686.tar.gz)" ELF32
     fi
     try "$architecture: it needs the C library and ps" \
         field_is "$deb" Depends "$(packaging/debian/dependencies "$architecture" "$scratch/velmora"), procps"
