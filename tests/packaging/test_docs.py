@@ -1,5 +1,6 @@
 """Every command line of the documents, and those of velmora(1), do what they are there for."""
 
+import pathlib
 import re
 import shutil
 import subprocess
@@ -13,7 +14,7 @@ BY_USERS = [page.name for page in blocks.pages() if "sh" in [kind for kind, _ in
 
 
 def test_the_pages_with_command_lines_are_found():
-    assert BY_USERS == ["administrators.md", "support.md"]
+    assert BY_USERS == ["administrators.md", "interrupted-resets.md", "support.md"]
 
 
 @pytest.mark.parametrize("page", blocks.pages(), ids=lambda page: page.name)
@@ -25,14 +26,29 @@ def test_a_command_line_stands_in_a_block_that_is_run(page):
     assert {kind for kind, _ in blocks.blocks(page)} <= set(blocks.KINDS)
     assert text.count("```") == 2 * len(blocks.blocks(page))
     assert re.findall(r"^\s*[$#] ?(?:velmora|\./|sudo|apt|cmake)\b.*", text, re.M) == []
-    inline = re.findall(r"`((?:velmora|man|ls|rm|cat|grep|tail|head|systemctl|apt-get|dpkg|cmake|ctest)\s[^`]*)`", text)
+    inline = re.findall(r"`((?:velmora|man|ls|rm|cat|grep|tail|head|systemctl|apt-get|dpkg|cmake|ctest|mv|cp|kill|chmod|echo)\s[^`]*)`", text)
     assert inline == []
 
 
-def run_in_order(commands):
+WORKSPACE = pathlib.Path("/mnt/home/VANTOR/RCP/velmora/anna")
+UPDATE = WORKSPACE / ".config" / "org.eclipse.update"
+
+
+def interrupted_reset(installation):
+    """The configuration has become the backup, and the copies are not moved back; the next start has begun a new one."""
+    for name in ("registry", "bookmarks.xml"):
+        (UPDATE / name).write_text(name + " of before\n")
+        (WORKSPACE / (name + ".old")).write_text(name + " of before\n")
+    (WORKSPACE / ".config").rename(WORKSPACE / ".configbak")
+    assert installation.run(["velmora", "-velmoraWait"]) == (0, "", "")
+    assert UPDATE.is_dir() and not (UPDATE / "registry").exists()
+
+
+def run_in_order(commands, before=lambda _: None):
     def story(installation):
         # A user who has started before: there are logs to look at.
         assert installation.run(["velmora", "-velmoraWait"]) == (0, "", "")
+        before(installation)
         done = []
         for text in commands:
             done.append((text, installation.run(["bash", "-eu", "-o", "pipefail", "-c", text])))
@@ -45,7 +61,8 @@ def test_the_command_lines_of_a_page_run(installation, page):
     needs("man", "man-db")
     needs("pgrep", "procps")
     commands = [text for kind, text in blocks.blocks(ROOT / "docs" / page) if kind == "sh"]
-    for text, (status, out, err) in installation.isolated(run_in_order(commands)):
+    before = [interrupted_reset] if page == "interrupted-resets.md" else []
+    for text, (status, out, err) in installation.isolated(run_in_order(commands, *before)):
         assert (status, err) == (0, ""), text
         # Each of them shows something, but those that start or reset.
         assert out != "" or text.startswith("velmora "), text
@@ -81,6 +98,16 @@ def test_what_a_reset_does(installation):
         run_in_order(commands)(world)
         return world.run(["ls", "-A", "/mnt/home/VANTOR/RCP/velmora/anna"])
     assert ".configbak" in installation.isolated(story)[1].splitlines()
+
+
+def test_what_an_interrupted_reset_left_is_brought_back(installation):
+    commands = [text for kind, text in blocks.blocks(ROOT / "docs" / "interrupted-resets.md") if kind == "sh"]
+
+    def story(world):
+        run_in_order(commands, interrupted_reset)(world)
+        return [(UPDATE / name).read_text() for name in ("registry", "bookmarks.xml")], sorted(
+            path.name for path in WORKSPACE.glob("*.old"))
+    assert installation.isolated(story) == (["registry of before\n", "bookmarks.xml of before\n"], [])
 
 
 def test_the_examples_of_the_manual_run(installation):
