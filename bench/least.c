@@ -2,8 +2,9 @@
  * The least that a start takes: a dynamic C program in the user's locale that touches the files
  * which a start has to, each of them once, understands none of them, and starts the platform.
  *
- *     least APP WORKSPACE PROGRAM          a warm start
- *     least APP WORKSPACE PROGRAM first    makes the user area
+ *     least APP WORKSPACE PROGRAM           a warm start
+ *     least APP WORKSPACE PROGRAM first     makes the user area
+ *     least APP WORKSPACE PROGRAM beside    the platform runs, which the shell's ps is asked
  */
 #define _GNU_SOURCE
 #include <fcntl.h>
@@ -130,26 +131,47 @@ static pid_t start(const char* program)
     return child;
 }
 
-/* Up to the lock, which names a platform that is no more, or none. */
-static int begin(const char* app, const char* area, int first)
+enum kind { WARM, FIRST, BESIDE };
+
+static void ask_shell(int pid)
+{
+    char command[100];
+    snprintf(command, sizeof command, "ps h %d | grep eclipse 2>&1 1>/dev/null", pid);
+    if (system(command) != 0)
+        exit(1);
+}
+
+/* Up to the lock, which names a platform, or none before a first start. */
+static int begin(const char* app, const char* area, enum kind kind)
 {
     if (readlink("/proc/self/exe", text, PIECE) < 0)
         exit(1);
     read_text(below(app, "rcp/velmora.properties"));
     look(below(app, "rcp/prov.debug/debug.txt"));
     look(area);
-    if (first)
+    if (kind == FIRST)
         make_folders(area);
     int lock = opened(below(area, ".rcp.lock"), O_RDWR | O_CREAT);
-    if (flock(lock, LOCK_EX) != 0 || (read(lock, text, PIECE) > 0) == first)
+    if (flock(lock, LOCK_EX) != 0 || (read(lock, text, PIECE) > 0) == (kind == FIRST))
         exit(1);
-    if (!first && kill(atoi(text), 0) == 0)
+    int pid = kind == FIRST ? 0 : atoi(text);
+    if (pid > 0 && (kill(pid, 0) == 0) != (kind == BESIDE))
         exit(1);
+    if (kind == BESIDE)
+        ask_shell(pid);
     look(below(area, ".sid"));
     return lock;
 }
 
-static int prepare(const char* app, const char* area, int first)
+static void tell_start(const char* area)
+{
+    time_t now = time(NULL);
+    strftime(text, PIECE, "Started %c\n", localtime(&now));
+    write_text(below(area, "logs/shutdown.log"), O_APPEND, text);
+    read_text(below(area, "logs/shutdown.log"));
+}
+
+static int prepare(const char* app, const char* area, enum kind kind)
 {
     look(below(area, "logs"));
     int log = opened(below(area, "logs/velmora.log"), O_WRONLY | O_CREAT | O_TRUNC);
@@ -158,35 +180,42 @@ static int prepare(const char* app, const char* area, int first)
     look(below(area, "applications/eclipse/features"));
     look(below(area, "applications/eclipse/plugins"));
     look(below(app, "shared/eclipse/.eclipseextension"));
-    write_text(below(area, ".config/args.properties"), O_TRUNC, "arg0=velmora\n");
+    if (kind != BESIDE)
+        write_text(below(area, ".config/args.properties"), O_TRUNC, "arg0=velmora\n");
     look(below(area, ".config/config.ini"));
-    if (first)
+    if (kind == FIRST)
         make_copies(app, area);
     read_text(below(area, ".config/rcpinstall.properties"));
     read_text(below(area, ".config/args.properties"));
     read_text(below(app, "rcp/eclipse/plugins/velmora.demo.jvm/jvm.properties"));
     look(below(area, ".config/org.eclipse.update/platform.xml"));
-    time_t now = time(NULL);
-    strftime(text, PIECE, "Started %c\n", localtime(&now));
-    write_text(below(area, "logs/shutdown.log"), O_APPEND, text);
-    read_text(below(area, "logs/shutdown.log"));
+    if (kind != BESIDE)
+        tell_start(area);
     put(log, "The words of the platform would stand here.\n");
     return log;
+}
+
+static void record(const char* area, int lock, pid_t child)
+{
+    ssize_t length = snprintf(text, sizeof text, "%ld          ", (long)child);
+    write_text(below(area, ".rcp.main"), O_TRUNC, text);
+    if (pwrite(lock, text, (size_t)length, 0) != length)
+        exit(1);
 }
 
 int main(int argc, char** argv)
 {
     if (argc < 4 || !setlocale(LC_CTYPE, ""))
         return 1;
+    enum kind kind = argc == 4 ? WARM : strcmp(argv[4], "first") == 0 ? FIRST : BESIDE;
     const char *app = argv[1], *area = argv[2];
-    int first = argc > 4;
-    int lock = begin(app, area, first), log = prepare(app, area, first);
+    int lock = begin(app, area, kind), log = prepare(app, area, kind);
     pid_t child = start(argv[3]);
     if (child < 0)
         return 1;
-    ssize_t length = snprintf(text, sizeof text, "%ld          ", (long)child);
-    write_text(below(area, ".rcp.main"), O_TRUNC, text);
-    if (pwrite(lock, text, (size_t)length, 0) != length || flock(lock, LOCK_UN) != 0)
+    if (kind != BESIDE)
+        record(area, lock, child);
+    if (flock(lock, LOCK_UN) != 0)
         return 1;
     put(log, "The lock is released.\n");
     return 0;

@@ -110,7 +110,7 @@ def targets(result):
         ("first", "a first start to the child, times the limit", 2.0, *times("first", least=True)),
         ("fatal", "a fatal end to its end, times a warm start's", 1.0, *times("fatal", "BUILD-warm", "to_exit")),
         ("beside", "beside a running platform to the child, times the limit after `ps` and `grep`", 1.15,
-         *times("beside", "limit-ps")),
+         *times("beside", "limit-ps", least=True)),
         ("dash", "a warm start to the child, times the dash script", 0.15, *times("warm", "dash", least=True)),
         ("jpackage", "a warm start to the child, times the `jpackage` launcher", 0.35,
          *times("warm", "jpackage", least=True)),

@@ -196,15 +196,15 @@ class Start(Contestant):
 
 
 class Least(Contestant):
-    """A program that only touches the files of a start; its warm starts are in a user area of velmora's."""
+    """A program that only touches the files of a start; but for first starts, in a user area of velmora's."""
 
     def __init__(self, build, scenario):
         self.start = Start(build, scenario, name="least-%s-%s" % (build, scenario))
         app = "/mnt/%s/app" % build
         super().__init__(self.start.name, "dynamic C program, the files of %s" % SCENARIOS[scenario],
                          [PARTS + "/least-" + build, app, self.start.workspace, app + ECLIPSE])
-        if scenario == "first":
-            self.command.append("first")
+        if scenario != "warm":
+            self.command.append(scenario)
 
     def prepare(self):
         self.start.prepare()
@@ -248,7 +248,7 @@ class World:
             Contestant("limit", "static C program: fork, exec", [PARTS + "/limit", child]),
             Contestant("floor-native", "dynamic C program, locale set", [PARTS + "/floor-native", child]),
             Contestant("floor-i686", "dynamic C program, locale set", [PARTS + "/floor-i686", child]),
-            *(Least(build, scenario) for scenario in ("first", "warm") for build in ("native", "i686")),
+            *(Least(build, scenario) for scenario in ("first", "warm", "beside") for build in ("native", "i686")),
             Script("dash", "dash script, four settings", ["/mnt/native/app/rcp/naive.sh"]),
             JavaLauncher("jpackage", "`jpackage` launcher, no package tool on PATH", ["/mnt/java/bin/platform"],
                          PATH="/mnt/no-tools"),

@@ -18,7 +18,7 @@ LAUNCHERS = {build: ROOT / "build" / build / "velmora" for build in ("native", "
 SCENARIOS = ["first", "warm", "daily", "beside", "fatal"]
 VELMORA = [build + "-" + scenario for build in LAUNCHERS for scenario in SCENARIOS]
 OTHERS = ["limit", "limit-ps", "floor-native", "floor-i686", "least-native-first", "least-i686-first",
-          "least-native-warm", "least-i686-warm", "dash", "jpackage"]
+          "least-native-warm", "least-i686-warm", "least-native-beside", "least-i686-beside", "dash", "jpackage"]
 
 sys.dont_write_bytecode = True
 sys.path[:0] = [str(BENCH), str(ROOT / "tests" / "sweeps")]
