@@ -140,7 +140,8 @@ def targets_table(result):
     for what, bound, found, note in target_rows(result):
         rows.append([what, figure(bound)])
         for value, least, reached in found:
-            rows[-1] += [figure(value), "" if least is None else figure(least), REACHED[reached]]
+            missed = not reached and figure(value) == figure(bound)  # by less than the digits show
+            rows[-1] += ["%.3f" % value if missed else figure(value), "" if least is None else figure(least), REACHED[reached]]
         rows[-1].append(note)
     return table(*rows)
 
