@@ -9,17 +9,30 @@ import re
 import time
 
 from lab import EXIT_DATA, LONGEST, UPDATE, write
-from world import CONFIG, HOME, LOCK, USER_PROPERTIES, WORKSPACE, lines, read, user_logs, temp_logs
+from world import CONFIG, ECLIPSE, HOME, LOCK, USER_PROPERTIES, WORKSPACE, lines, read, user_logs, temp_logs
 
 FATAL = re.compile(r"QVMRL[0-9]{4}E")
 
 
 class Scenario:
-    def __init__(self, name, title, prepare, words=(), next_words=(), daemon=False, statuses=(0, 255), lasting=True):
+    def __init__(self, name, title, prepare, words=(), next_words=(), daemon=False, statuses=(0, 255), lasting=True,
+                 starts_once=True, platform=None):
         self.name, self.title, self.prepare = name, title, prepare
         self.words, self.next_words = list(words), list(next_words)
         self.daemon, self.statuses = daemon, statuses
         self.lasting = lasting  # a platform stays until it is told to end
+        self.starts_once = starts_once  # a platform that cannot be executed ends the start
+        self._platform = platform  # what stands in the place of the platform during the disturbed start
+
+    def spoil(self, lab):
+        """What is otherwise than usual during the disturbed start."""
+        if self._platform is not None:
+            write(ECLIPSE, self._platform, 0o755)
+
+    def mend(self, lab):
+        """As usual again, for the starts after it."""
+        if self._platform is not None:
+            write(ECLIPSE, lab.pieces["stand_in"], 0o755)
 
 
 def _first(lab):
@@ -83,7 +96,9 @@ SCENARIOS = {scenario.name: scenario for scenario in (
     Scenario("provisioning", "a provisioning launch", _provisioning, lasting=False),
     Scenario("reset", "a reset", _reset, words=["-resetconfig"]),
     Scenario("renewal", "a start after the installation has changed", _renewal),
-    Scenario("kiosk", "a kiosk pass", _kiosk, statuses=(0, 1, 255), lasting=False),
+    Scenario("restart", "a restart", _second, words=["-restart", "-rcp_old_pid", "4711"]),
+    Scenario("unstartable", "a platform that cannot be executed", _second, platform="no program", starts_once=False),
+    Scenario("kiosk", "a kiosk pass", _kiosk, statuses=(0, 1, 255), lasting=False, starts_once=False),
 )}
 
 
@@ -100,7 +115,10 @@ def prepare(lab, scenario):
     for words in (scenario.words, None):  # whether the start has done its work, or nothing at all
         lab.reset()
         if words is not None:
+            scenario.spoil(lab)
             assert lab.run(*words) == (0, ""), "an undisturbed start"
+            lab.platforms()
+            scenario.mend(lab)
             lab.between = lab.snapshot()
         problems = follow_up(lab, scenario)
         assert problems == [], problems

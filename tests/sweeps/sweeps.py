@@ -1,15 +1,16 @@
 """The sweeps: which calls there are, what is done at each of them, and what came of it.
 
 A call of the launcher is one that comes after main has begun. main begins with opening /dev/null for the standard
-descriptors, which nothing before it does; test_boundary.py holds this. What children do is not looked at, since strace
-does not follow them.
+descriptors, which nothing before it does; test_harness.py holds this. Of the child that becomes the platform the exec is
+made to fail; what other children do is not looked at, since strace does not follow them.
 """
 
 import re
 
+import outside
 from lab import TRACE, Lab, hold_still
 from scenarios import SCENARIOS, follow_up, judge_end, prepare, short_for_now
-from world import read
+from world import ECLIPSE, read
 
 MAIN_BEGINS = re.compile(r'openat\([^,]*, "/dev/null", O_RDWR(\|O_LARGEFILE)?\)')
 
@@ -19,7 +20,7 @@ CHANGE_ERRORS = ["ENOSPC", "EROFS"] + PATH_ERRORS
 ERRORS = {
     "read": ["EIO", "EINTR"],
     "write": ["ENOSPC", "EIO", "EINTR"],
-    "close": ["EIO", "EINTR"],
+    "close": ["EIO", "EINTR", "ENOSPC"],
     "fsync": ["EIO", "ENOSPC", "EINTR"],
     "lseek": ["EIO"], "_llseek": ["EIO"],
     "flock": ["EINTR", "EIO", "ENOMEM"],
@@ -32,7 +33,8 @@ ERRORS = {
     "dup": ["EMFILE"], "dup2": ["EMFILE"], "dup3": ["EMFILE"],
     "mmap": ["ENOMEM", "EACCES"], "mmap2": ["ENOMEM", "EACCES"],
     "mprotect": ["ENOMEM", "EACCES"], "munmap": ["ENOMEM"], "mremap": ["ENOMEM"], "brk": ["ENOMEM"],
-    "clone": ["ENOMEM"], "clone3": ["ENOMEM"], "fork": ["ENOMEM"], "vfork": ["ENOMEM"],
+    "clone": ["ENOMEM", "EAGAIN"], "clone3": ["ENOMEM", "EAGAIN"], "fork": ["ENOMEM", "EAGAIN"],
+    "vfork": ["ENOMEM", "EAGAIN"],
     "access": PATH_ERRORS, "faccessat": PATH_ERRORS, "readlink": PATH_ERRORS, "readlinkat": PATH_ERRORS,
     "stat": PATH_ERRORS, "lstat": PATH_ERRORS, "fstat": ["EIO", "ENOMEM"], "newfstatat": PATH_ERRORS,
     "stat64": PATH_ERRORS, "lstat64": PATH_ERRORS, "fstat64": ["EIO", "ENOMEM"], "fstatat64": PATH_ERRORS,
@@ -45,8 +47,15 @@ OPEN_ERRORS = ["EMFILE", "EINTR"] + PATH_ERRORS
 CREATE_ERRORS = ["ENOSPC", "EROFS"] + OPEN_ERRORS
 
 
+# A restart's wait for the old platform, which is gone already, takes no time.
+SLEEPS = "clock_nanosleep,clock_nanosleep_time64"
+NO_SLEEP = ["-e", "inject=%s:retval=0" % SLEEPS]
+
+
 class Call:
     """The n-th call of this name in the life of the process, the loader's included."""
+
+    of_child = False
 
     def __init__(self, name, number, shown):
         self.name, self.number, self.shown = name, number, shown
@@ -54,6 +63,9 @@ class Call:
     def errors(self):
         if self.name in ("open", "openat"):
             return CREATE_ERRORS if re.search(r"O_WRONLY|O_RDWR|O_CREAT", self.shown) else OPEN_ERRORS
+        # The system closes a pipe whatever happens; strace, which has the call fail, leaves it open.
+        if self.name == "close" and self.path().startswith("pipe:"):
+            return []
         return ERRORS.get(self.name, [])
 
     def path(self):
@@ -71,8 +83,24 @@ class Call:
             what = "signal=KILL"
         else:
             what = "error=" + what
-        return ["-e", "trace=" + self.name, "-e", "signal=none",
+        # Of two injections for a call the later one counts.
+        return ["-e", "trace=%s,%s" % (self.name, SLEEPS), "-e", "signal=none", *NO_SLEEP,
                 "-e", "inject=%s:%s:when=%d" % (self.name, what, self.number)]
+
+
+class ChildsExec(Call):
+    """The exec with which a child of the launcher would become the platform. It fails in each child that tries."""
+
+    of_child = True
+
+    def __init__(self):
+        super().__init__("execve", 0, 'execve("%s")' % ECLIPSE)
+
+    def errors(self):
+        return ["EACCES", "EIO", "EMFILE", "ENOENT", "ENOEXEC", "ENOMEM", "E2BIG", "ETXTBSY"]
+
+    def injection(self, what):
+        return ["-f", "-P", ECLIPSE, "-e", "trace=execve", "-e", "signal=none", "-e", "inject=execve:error=" + what]
 
 
 def launcher_calls(text):
@@ -108,16 +136,21 @@ def list_calls(pieces, name):
 
 
 def list_calls_of(lab, scenario):
-    status, said = lab.run(*scenario.words, strace=["-e", "signal=none"])
+    scenario.spoil(lab)
+    status, said = lab.run(*scenario.words, strace=[*NO_SLEEP, "-e", "signal=none"])
+    scenario.mend(lab)
     assert (status, said) == (0, "")
-    return launcher_calls(read(TRACE))
+    calls = launcher_calls(read(TRACE))
+    return calls + [ChildsExec()] if scenario.starts_once else calls
 
 
 def disturbed(lab, scenario, call, what):
     """One disturbed start in a fresh user area: its case, with what is wrong."""
     lab.reset()
+    scenario.spoil(lab)
+    before = outside.around()
     status, said = lab.run(*scenario.words, strace=call.injection(what))
-    trace = read(TRACE)
+    disturbed_calls = [line for line in read(TRACE).splitlines() if "(INJECTED" in line and call.name + "(" in line]
     case = {"scenario": scenario.name, "call": call.name, "number": call.number, "what": what, "path": call.path(),
             "status": status, "row": "", "lines": lab.error_lines(), "problems": []}
     if what == "KILL":
@@ -126,10 +159,12 @@ def disturbed(lab, scenario, call, what):
             return case
         case["problems"] = short_for_now(lab)
     else:
-        if "(INJECTED" not in trace:
+        if not disturbed_calls:
             case["problems"] = ["not-reached"]
             return case
         case["problems"], case["row"] = judge_end(lab, scenario, status, said)
+    case["problems"] = case["problems"] + outside.changes(before)
+    scenario.mend(lab)
     case["problems"] = case["problems"] + follow_up(lab, scenario)
     return case
 
