@@ -8,6 +8,7 @@
 #include <dirent.h>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <vector>
 
 bool createDirectory(const wchar_t* path)
 {
@@ -16,19 +17,36 @@ bool createDirectory(const wchar_t* path)
     return mkdir(narrowPath.c_str(), 0775) == 0;
 }
 
+// "/a", "/a/b" and so on, for "/a/b/...".
+static std::vector<std::wstring> levelsOf(const std::wstring& path)
+{
+    std::vector<std::wstring> levels;
+    std::wstring soFar;
+    std::wstring::size_type at = path.find_first_not_of(L"/\\");
+    while (at != std::wstring::npos) {
+        const std::wstring::size_type end = path.find_first_of(L"/\\", at);
+        soFar += L'/' + path.substr(at, end - at);
+        levels.push_back(soFar);
+        at = path.find_first_not_of(L"/\\", end);
+    }
+    return levels;
+}
+
 bool mkdirs(const wchar_t* path)
 {
-    const std::wstring parts = path;
-    std::wstring soFar = L"/";
+    const std::vector<std::wstring> levels = levelsOf(path);
     bool made = true;
-    std::wstring::size_type at = parts.find_first_not_of(L"/\\");
-    while (at != std::wstring::npos) {
-        const std::wstring::size_type end = parts.find_first_of(L"/\\", at);
-        soFar += parts.substr(at, end - at);
-        made = createDirectory(soFar.c_str());
-        soFar += L'/';
-        at = parts.find_first_not_of(L"/\\", end);
+    // From the last level back to one that stands: most levels of a path do, and what stands above
+    // that one needs no look.
+    std::vector<std::wstring>::size_type missing = levels.size();
+    while (missing > 0) {
+        made = createDirectory(levels[missing - 1].c_str());
+        if (made || errno == EEXIST)
+            break;
+        --missing;
     }
+    for (; missing < levels.size(); ++missing)
+        made = createDirectory(levels[missing].c_str());
     return made;
 }
 

@@ -120,6 +120,39 @@ TEST(mkdirs, IsFalseWhenTheLastLevelCannotBeMade)
     EXPECT_EQ(errno, ENOTDIR);
 }
 
+TEST(mkdirs, MakesTheLevelsAboveOneThatCannotBeMade)
+{
+    TempDir dir;
+    EXPECT_FALSE(mkdirs((dir.wide("a/b/") + std::wstring(300, L'x')).c_str()));
+    EXPECT_EQ(errno, ENAMETOOLONG);
+    EXPECT_EQ(pathsIn(dir.dir), (Paths{"a", "a/b"}));
+    // The whole path is too long, though each of its names is not.
+    std::wstring deep = dir.wide("c");
+    for (int i = 0; i < 20; ++i)
+        deep += L"/" + std::wstring(250, L'x');
+    EXPECT_FALSE(mkdirs(deep.c_str()));
+    EXPECT_EQ(errno, ENAMETOOLONG);
+    EXPECT_TRUE(dir.has("c/" + std::string(250, 'x') + "/" + std::string(250, 'x')));
+}
+
+TEST(mkdirs, MakesALevelThatThePathLeavesAgain)
+{
+    TempDir dir;
+    EXPECT_TRUE(mkdirs(dir.wide("a/../b/./c").c_str()));
+    EXPECT_EQ(pathsIn(dir.dir), (Paths{"a", "b", "b/c"}));
+}
+
+TEST(mkdirs, ALinkThatLeadsNowhereStandsInTheWay)
+{
+    TempDir dir;
+    ASSERT_EQ(symlink(dir.path("nowhere").c_str(), dir.path("link").c_str()), 0);
+    EXPECT_FALSE(mkdirs(dir.wide("link").c_str()));
+    EXPECT_EQ(errno, EEXIST);
+    EXPECT_FALSE(mkdirs(dir.wide("link/a").c_str()));
+    EXPECT_EQ(errno, ENOENT);
+    EXPECT_FALSE(dir.has("nowhere"));
+}
+
 TEST(mkdirs, IsTrueForAPathWithoutParts)
 {
     EXPECT_TRUE(mkdirs(L""));
