@@ -208,6 +208,8 @@ bool replaceUserPlaceholders(std::wstring& s, const PropertyList& props)
 bool replaceAllPlaceholders(const std::wstring& workspace, const std::wstring& rcpHome,
                             std::wstring& s, const PropertyList& props)
 {
+    if (s.find(L"${") == std::wstring::npos)
+        return false;
     bool changed = replaceStdPlaceholders(workspace, rcpHome, s);
     std::wstring resolved = s;
     if (!replaceUserPlaceholders(resolved, props))

@@ -4,6 +4,7 @@
 #include "launcher/properties/property_text.h"
 #include "platform/linux/files.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <cwchar>
 
@@ -21,7 +22,7 @@ static bool isSeparator(wchar_t c)
     return c == L'=' || c == L':' || c == L' ' || c == L'\t';
 }
 
-// Adds the characters of one physical line.
+// Adds the characters of one physical line, which has no line end.
 static void walkLine(const std::wstring& line, PropertyParts& parts)
 {
     bool separatorAllowed = true;
@@ -36,8 +37,6 @@ static void walkLine(const std::wstring& line, PropertyParts& parts)
                 ++i;
         }
         const wchar_t c = line[i];
-        if (c == L'\n')
-            continue;
         if (separatorAllowed && isSeparator(c)) {
             parts.inValue = true;
             if (parts.isXLine)
@@ -57,7 +56,10 @@ static void walkLine(const std::wstring& line, PropertyParts& parts)
         // property whose line ends in one goes on until a character of its value has come.
         parts.continued = false;
         separatorAllowed = false;
-        parts.value += c;
+        // What follows means nothing else before the next backslash.
+        const std::wstring::size_type end = std::min(line.find(L'\\', i + 1), line.size());
+        parts.value.append(line, i, end - i);
+        i = end - 1;
     }
 }
 
@@ -98,9 +100,12 @@ bool getPropertiesIfPresent(const std::wstring& path, PropertyList& list)
     if (file == nullptr)
         return false;
     PropertyParts parts;
-    wchar_t line[LINE_ROOM];
-    while (feof(file) == 0 && readFile(file, L" %2024[^\n]\n", line) != EOF)
+    wchar_t text[LINE_ROOM];
+    std::wstring line;
+    while (feof(file) == 0 && readFile(file, L" %2024[^\n]\n", text) != EOF) {
+        line = text;
         takeLine(line, parts, list);
+    }
     // A property that still continues at the end of the file is never finished.
     fclose(file);
     return true;

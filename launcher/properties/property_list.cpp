@@ -1,6 +1,7 @@
 #include "launcher/properties/property_list.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "launcher/properties/property_index.h"
 #include "launcher/properties/property_text.h"
 #include "platform/linux/wide_strings.h"
 
@@ -8,7 +9,8 @@
 
 static wchar_t* newCopy(const wchar_t* text)
 {
-    return initMemString(newString(wcslen(text)), text);
+    const size_t length = wcslen(text);
+    return wmemcpy(newString(length), text, length + 1);
 }
 
 void appendProperty(PropertyList& list, const std::wstring& key, const std::wstring& value)
@@ -28,8 +30,13 @@ void pushBackProperty(PropertyList& list, std::wstring& key, std::wstring& value
 
 wchar_t* findProperty(const wchar_t* key, const PropertyList& list)
 {
+    if (isIndexed(list)) {
+        const PropertyList::size_type at = findByIndex(key, list);
+        return at == list.size() ? nullptr : list[at + 1];
+    }
     for (PropertyList::size_type i = 0; i + 1 < list.size(); i += 2) {
-        if (wcscmp(list[i], key) == 0)
+        // Most keys differ at once, and are not worth a call.
+        if (list[i][0] == key[0] && wcscmp(list[i], key) == 0)
             return list[i + 1];
     }
     return nullptr;
@@ -77,6 +84,9 @@ void replaceValue(const wchar_t* key, const wchar_t* newValue, PropertyList& lis
     for (PropertyList::size_type i = 0; i + 1 < list.size(); ++i) {
         if (wcscmp(list[i], key) != 0)
             continue;
+        // What stands behind a value is a key.
+        if (i % 2 == 1)
+            forgetIndex();
         wchar_t* replaced = list[i + 1];
         list[i + 1] = newCopy(newValue);
         freeString(replaced);
@@ -95,6 +105,7 @@ void setArgProperty(std::wstring& out, const wchar_t* key, const wchar_t* value)
 
 void freeProperties(PropertyList& list)
 {
+    forgetIndex();
     for (wchar_t* text : list)
         freeString(text);
     list.clear();

@@ -9,8 +9,8 @@ void trimString(std::wstring& s)
     const std::wstring::size_type first = s.find_first_not_of(L' ');
     if (first == std::wstring::npos)
         return;
-    const std::wstring::size_type last = s.find_last_not_of(L' ');
-    s = s.substr(first, last + 1 - first);
+    s.erase(s.find_last_not_of(L' ') + 1);
+    s.erase(0, first);
 }
 
 void FilterProp(std::wstring& key)
@@ -44,6 +44,10 @@ static wchar_t escapedCharacter(const std::wstring& digits)
 
 void FilterValue(std::wstring& value)
 {
+    if (value.find(L'\\') == std::wstring::npos) {
+        trimString(value);
+        return;
+    }
     std::wstring out;
     out.reserve(value.size());
     for (std::wstring::size_type i = 0; i < value.size(); ++i) {

@@ -1,6 +1,7 @@
 #include "launcher/properties/vmarg_map.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "launcher/properties/property_index.h"
 #include "platform/linux/wide_strings.h"
 
 #include <cwchar>
@@ -14,6 +15,7 @@ void insertPropToVmargMap(VmargMap& map, PropertyList& list)
 {
     if (list.empty())
         return;
+    forgetIndex();
     PropertyList others;
     for (PropertyList::size_type i = 0; i + 1 < list.size(); i += 2) {
         if (!isVmargWord(list[i])) {

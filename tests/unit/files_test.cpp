@@ -1,5 +1,6 @@
 #include "platform/linux/files.h"
 
+#include "platform/linux/wide_strings.h"
 #include "tests/unit/separate_process.h"
 #include "tests/unit/support.h"
 
@@ -725,6 +726,57 @@ TEST(readFile, EndsTheTextAtAZero)
     Reader reader(std::string("ab\0cd\nnext\n", 11));
     EXPECT_EQ(reader.read(LINE), L"1 ab");
     EXPECT_EQ(reader.read(LINE), L"1 next");
+}
+
+// Each result and line that `read` takes out of the text, and where the text is then.
+template <typename Read>
+static std::string scanned(std::string text, Read read)
+{
+    FILE* file = fmemopen(&text[0], text.size(), "r");
+    std::string all;
+    int result = 0;
+    do {
+        std::string line;
+        result = read(file, line);
+        all += std::to_string(result) + " " + line + " " + std::to_string(ftell(file));
+        all += feof(file) != 0 ? " end\n" : "\n";
+    } while (result != EOF);
+    fclose(file);
+    return all;
+}
+
+static int readByTheCLibrary(FILE* file, std::string& line)
+{
+    char bytes[LINE_ROOM] = "";
+    const int result = fscanf(file, " %2024[^\n]\n", bytes);
+    line = bytes;
+    return result;
+}
+
+static int readByUs(FILE* file, std::string& line)
+{
+    wchar_t text[LINE_ROOM];
+    const int result = readFile(file, TRIMMED_LINE, text);
+    wcstochar(line, text);
+    return result;
+}
+
+// Its own scanner serves the format of the properties: every text of five of these characters.
+TEST(readFile, ScansATrimmedLineAsTheCLibraryDoes)
+{
+    const std::string letters("a \n\t\0\r", 6);
+    for (int number = 0; number < 6 * 6 * 6 * 6 * 6; ++number) {
+        std::string text;
+        for (int rest = number, i = 0; i < 5; ++i, rest /= 6)
+            text += letters[static_cast<size_t>(rest % 6)];
+        ASSERT_EQ(scanned(text, readByUs), scanned(text, readByTheCLibrary)) << number;
+    }
+    for (const size_t length : {2023U, 2024U, 2025U, 4048U, 4049U}) {
+        for (const char* end : {"", "\n", " \n", "\n\n b", " b"})
+            ASSERT_EQ(scanned(a(length) + end, readByUs),
+                      scanned(a(length) + end, readByTheCLibrary))
+                << length << end;
+    }
 }
 
 static std::vector<std::wstring> linesOf(const std::string& bytes)
