@@ -136,8 +136,20 @@ def test_the_command_lines_for_contributors_run(tmp_path):
         assert (done.returncode, done.stdout) == (0, ""), text
 
 
+@pytest.mark.parametrize("page", ["README.md", "CONTRIBUTING.md", "example/README.md"])
+def test_the_commands_at_the_top_are_there_and_know_their_words(page):
+    """What these pages tell to be typed, held against the words that the scripts look for."""
+    found = re.findall(r"(?:^    |`)\./(\w+)((?: --\w+)*)", (ROOT / page).read_text(), re.M)
+    assert found
+    for name, options in found:
+        done = subprocess.run([ROOT / name, "--help"], stdout=subprocess.PIPE, text=True)
+        assert done.returncode == 0
+        for option in options.split():
+            assert re.search(r"^ +%s\)" % option, (ROOT / name).read_text(), re.M), (name, option)
+
+
 def test_links_between_the_pages_lead_somewhere():
-    for page in blocks.pages():
+    for page in [*blocks.pages(), *(ROOT / name for name in ("README.md", "CONTRIBUTING.md", "example/README.md"))]:
         for target in re.findall(r"\]\(([^)#:]+)\)", page.read_text()):
             assert (page.parent / target).exists(), "%s: %s" % (page.name, target)
 
