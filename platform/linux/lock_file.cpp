@@ -13,6 +13,7 @@
 #include <cstdio>
 #include <cwchar>
 #include <fcntl.h>
+#include <stdio_ext.h>
 #include <sys/file.h>
 #include <unistd.h>
 
@@ -143,8 +144,11 @@ static bool rewriteLockFile(const std::string& text)
     // Anywhere else than at its start the number would stand behind the old one, and not be found.
     if (fseek(lockFILE, 0, SEEK_SET) != 0)
         return false;
-    const bool written = fputs(text.c_str(), lockFILE) >= 0;
-    return fflush(lockFILE) == 0 && written;
+    if (fputs(text.c_str(), lockFILE) >= 0 && fflush(lockFILE) == 0)
+        return true;
+    // Nor is it written later, when the process ends and the lock is somebody else's.
+    __fpurge(lockFILE);
+    return false;
 }
 
 void invalidateLockFile()
@@ -160,7 +164,9 @@ void populateLockFile(int childPid)
     if (!isMainProcess())
         return;
     populateMainPidFile(static_cast<unsigned long>(childPid));
-    if (rewriteLockFile(std::to_string(childPid) + "          "))
+    const std::string text = std::to_string(childPid) + "          ";
+    // Twice, since a second platform may be started beside one whose number is not there.
+    if (rewriteLockFile(text) || rewriteLockFile(text))
         return;
     const ForcedTrace forced;
     SvcDebugOutA("QVMRL0051E: Unable to write to platform lock file");
@@ -182,9 +188,17 @@ void populateMainPidFile(unsigned long mainPid)
     fclose(file);
 }
 
+// One that is there but cannot be opened for the moment is read all the same: it is open already.
+static bool lockFileIsThere()
+{
+    std::string path;
+    wcstochar(path, lockFilePath.c_str());
+    return access(path.c_str(), F_OK) == 0 || (errno != ENOENT && errno != ENOTDIR);
+}
+
 bool isMainProcessRunning(const std::wstring& exeName)
 {
-    if (!exists(lockFilePath.c_str()))
+    if (!lockFileIsThere())
         return false;
     const ForcedTrace forced;
     SvcDebugOutA("QVMRL0090E: Existing platform lock file found - checking validity.");
@@ -194,20 +208,20 @@ bool isMainProcessRunning(const std::wstring& exeName)
     rewind(lockFILE);
     const int numbers = fscanf(lockFILE, "%ld", &pid);
     const int reason = errno;
+    const bool atItsEnd = ferror(lockFILE) == 0;
     // What is left in the buffer goes at once: a child that ends as a launcher would set the shared
     // position of the file back by that much, in the middle of a later write of ours.
     fflush(lockFILE);
     errno = reason;
-    switch (numbers) {
-    case EOF:
-        SvcDebugOutA("QVMRL0091E: No data in the platform lock file.");
-        return false;
-    case 1:
+    if (numbers == 1)
         return isPlatformAlive(pid, exeName);
-    default:
+    // Decision: what cannot be read is no empty file. A platform may run, and a second one must not
+    // be started beside it.
+    if (numbers == EOF && atItsEnd)
+        SvcDebugOutA("QVMRL0091E: No data in the platform lock file.");
+    else
         fatalErrorA("QVMRL0092E: Error reading platform lock file.", EXIT_PROCESS, WITH_ERRNO);
-        return false;
-    }
+    return false;
 }
 
 long getPlatformPid()

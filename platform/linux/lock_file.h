@@ -44,7 +44,8 @@ void populateLockFile(int childPid);
 void populateMainPidFile(unsigned long pid);
 
 /// True when the lock file names a live process that ps shows under a line with `exeName`.
-/// Fatal: "QVMRL0092E: Error reading platform lock file." when it does not begin with a number.
+/// Fatal: "QVMRL0092E: Error reading platform lock file." when it does not begin with a number, or
+/// cannot be read.
 bool isMainProcessRunning(const std::wstring& exeName);
 
 /// The process number that was read last from the lock file; 0 before.

@@ -1,5 +1,6 @@
 #include "platform/linux/platform_process.h"
 
+#include "platform/linux/process.h"
 #include "platform/linux/wide_strings.h"
 
 #include <cerrno>
@@ -51,6 +52,16 @@ static std::string platformTest(long pid, const std::wstring& exeName)
     return start + name + end;
 }
 
+// False when no shell could be had: of that the C library tells in errno alone, its result is that
+// of a shell that has found no command.
+static bool runShell(const std::string& command, int& status)
+{
+    errno = 0;
+    // The shell is required here: packages depend on ps.
+    status = system(command.c_str());
+    return errno != EAGAIN && errno != ENOMEM;
+}
+
 bool isPlatformAlive(long pid, const std::wstring& exeName)
 {
     // A number that no process can have is a dead one, also where pid_t is narrower than long.
@@ -61,7 +72,13 @@ bool isPlatformAlive(long pid, const std::wstring& exeName)
         return false;
     if (kill(static_cast<pid_t>(pid), 0) != 0 && errno == ESRCH)
         return false;
-    // The shell is required here: packages depend on ps.
-    const int status = system(platformTest(pid, exeName).c_str());
-    return status != -1 && WIFEXITED(status) && WEXITSTATUS(status) == 0;
+    const std::string test = platformTest(pid, exeName);
+    int status = 0;
+    if (!runShell(test, status)) {
+        // Decision: where there is no shell for want of memory or processes, there may be one a
+        // second later. Without one no platform could be started either.
+        sysSleep(1);
+        runShell(test, status);
+    }
+    return WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }

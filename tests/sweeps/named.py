@@ -37,13 +37,14 @@ OPENING = ("open", "openat")
 
 NAMED = (
     Named("platform-not-seen",
-          "A lock file that cannot be opened counts as absent, one that cannot be read as empty, and a process test that "
-          "cannot be run as a no.",
-          "A second platform starts in the workspace while the first one runs. It takes a shortage of descriptors or of "
-          "memory, or a broken disk, at that very moment.",
+          "A lock file of which the system says that it is not there holds no platform, and a process test that fails is "
+          "a no.",
+          "A second platform starts in the workspace while the first one runs. It takes a file system that denies a file "
+          "that is there, or a shell that cannot do its work, at that very moment.",
           "two-platforms", ("errors",), ("daemon",), path=r"\.rcp\.lock|"),
     Named("number-not-recorded",
-          "A failed write of the platform's number into the lock file is logged (QVMRL0051E), and the start goes on.",
+          "When the platform's number cannot be written into the lock file, not at the second try either, that is logged "
+          "(QVMRL0051E), and the start goes on.",
           "The next start finds no number and starts a second platform while the first one runs.",
           "two-platforms", ("errors",), calls=("write", "lseek", "_llseek"), path=r"\.rcp\.lock",
           when=_logged("QVMRL0051E")),

@@ -2,11 +2,12 @@
 
 import os
 import signal
+import time
 
 import pytest
 
 import sweeps
-from lab import Lab, hold_still
+from lab import TRACE, Lab, hold_still
 from scenarios import SCENARIOS, mains, prepare
 from world import LAUNCHER, LOCK, LOG, WORKSPACE, executable, read, read_bytes, until
 
@@ -48,7 +49,7 @@ def _workspace_made_meanwhile(pieces):
     lab, scenario = Lab(pieces), SCENARIOS["first"]
     prepare(lab, scenario)
     calls = [call for call in sweeps.list_calls_of(lab, scenario) if call.name == "mkdir"]
-    last = next(call for call in calls if call.path() == WORKSPACE)
+    last = [call for call in calls if call.path() == WORKSPACE][-1]
     lab.reset()
     delay = "inject=mkdir:delay_enter=300000:when=%d" % last.number
     start = lab.start(strace=["-e", "trace=mkdir", "-e", delay])
@@ -85,6 +86,23 @@ def _log_shared(pieces):
 def test_a_log_that_another_launcher_begins_anew(in_a_world):
     """Required as it is: the last line comes after the lock was released, and stands where the first log ended."""
     assert in_a_world(_log_shared) == (0, (0, ""), b"QVMRL0306I: lock file released @")
+
+
+def _no_shell_at_once(pieces):
+    """In a world: a start beside a platform, which is refused a child when it wants to run the shell."""
+    hold_still()
+    lab = Lab(pieces)
+    prepare(lab, SCENARIOS["daemon"])
+    lab.reset()
+    began = time.monotonic()
+    refused = lab.run(strace=["-e", "trace=clone,clone3,vfork", "-e", "inject=clone,clone3,vfork:error=EAGAIN:when=1"])
+    assert "EAGAIN" in read(TRACE)
+    return refused, time.monotonic() - began >= 1, [platform.argv for platform in mains(lab.platforms())]
+
+
+def test_a_shell_that_cannot_be_had_at_once(in_a_world):
+    """It is asked for again after a second; the platform is not taken for gone."""
+    assert in_a_world(_no_shell_at_once) == ((0, ""), True, [])
 
 
 @pytest.mark.parametrize("name, strace", [("first", SLOW_EXEC), ("second", SLOW_EXEC), ("provisioning", None)],

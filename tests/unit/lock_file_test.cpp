@@ -19,6 +19,7 @@
 #include <regex>
 #include <sys/file.h>
 #include <sys/prctl.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -338,6 +339,48 @@ TEST(isMainProcessRunning, EndsWithoutANumberAtTheStart)
     }
 }
 
+TEST(isMainProcessRunning, DecisionWhatCannotBeReadIsNoEmptyFile)
+{
+    TempDir dir;
+    const Platform platform;
+    dir.write(".rcp.lock", platform.number());
+    const auto action = [&] {
+        ASSERT_TRUE(makeFail(SYS_read, EIO));
+        locate(dir.wdir);
+    };
+    EXPECT_TRUE(endsWith(action, "QVMRL0092E: Error reading platform lock file.", EIO));
+}
+
+TEST(isMainProcessRunning, FindsThePlatformWithoutAnotherDescriptor)
+{
+    TempDir dir;
+    const Platform platform;
+    dir.write(".rcp.lock", platform.number());
+    EXPECT_TRUE(holdsInChild([&] {
+        locate(dir.wdir);
+        const struct rlimit few = {64, 64};
+        ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &few), 0);
+        while (open("/dev/null", O_RDONLY | O_CLOEXEC) >= 0) {
+        }
+        EXPECT_EQ(errno, EMFILE);
+        EXPECT_TRUE(isMainProcessRunning(NAME));
+    }));
+}
+
+TEST(isMainProcessRunning, DecisionWhereThereIsNoShellItIsAskedForOnceMore)
+{
+    TempDir dir;
+    const Platform platform;
+    dir.write(".rcp.lock", platform.number());
+    EXPECT_TRUE(holdsInChild([&] {
+        locate(dir.wdir);
+        ASSERT_TRUE(makeFail(SYS_clone3, EAGAIN));
+        const auto start = std::chrono::steady_clock::now();
+        EXPECT_FALSE(isMainProcessRunning(NAME));
+        EXPECT_GE(secondsSince(start), 0.99);
+    }));
+}
+
 TEST(isMainProcessRunning, ProcessOfAnotherUserCounts)
 {
     if (geteuid() != 0)
@@ -618,6 +661,20 @@ TEST(populateLockFile, LogsAFullDisk)
     EXPECT_EQ(dir.read(".rcp.main"), "1234    ");
 }
 
+TEST(populateLockFile, WritesNothingLaterThatMetAFullDisk)
+{
+    TempDir dir;
+    locate(dir.wdir);
+    const int lockFile = descriptorOf(dir.path(".rcp.lock"));
+    const int kept = dup(lockFile);
+    fillDiskOf(dir);
+    populateLockFile(1234);
+    ASSERT_GE(dup2(kept, lockFile), 0);
+    close(kept);
+    fflush(nullptr);
+    EXPECT_EQ(dir.read(".rcp.lock"), "");
+}
+
 TEST(populateMainPidFile, WritesTheNumberAnew)
 {
     TempDir dir;
@@ -801,6 +858,25 @@ TEST(getPipeName, ThereIsNoneWithoutTheFile)
     dir.write(".pipe", "late");
     EXPECT_TRUE(getPipeName(name));
     EXPECT_EQ(name, L"late");
+}
+
+TEST(getPipeName, ThereIsNoneWhileTheFileCannotBeOpened)
+{
+    TempDir dir;
+    dir.write(".pipe", "name");
+    EXPECT_TRUE(holdsInChild([&] {
+        locate(dir.wdir);
+        struct rlimit limit = {};
+        ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &limit), 0);
+        const struct rlimit none = {0, limit.rlim_max};
+        ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &none), 0);
+        std::wstring name = L"before";
+        EXPECT_FALSE(getPipeName(name));
+        EXPECT_EQ(name, L"before");
+        ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &limit), 0);
+        EXPECT_TRUE(getPipeName(name));
+        EXPECT_EQ(name, L"name");
+    }));
 }
 
 TEST(getPipeName, EmptyFileGivesAnEmptyName)
