@@ -22,11 +22,11 @@ package_group() {
                 "libequinox-common-java libequinox-registry-java libeclipse-core-jobs-java"
             ;;
         sanitizers) echo "g++ g++-multilib" ;;
-        coverage) echo "gcovr" ;;
+        coverage) echo "g++ python3" ;;
         valgrind) echo "valgrind" ;;
         fuzz) echo "clang llvm locales" ;;
         pages) echo "python3 python3-pytest cmake mandoc man-db desktop-file-utils appstream systemd" ;;
-        bench) echo "cmake g++ g++-multilib valgrind strace procps dash default-jdk-headless|openjdk-17-jdk-headless" ;;
+        bench) echo "cmake g++ g++-multilib libbenchmark-dev valgrind strace procps dash default-jdk-headless|openjdk-17-jdk-headless" ;;
         packaging) echo "dpkg-dev binutils file lintian debootstrap" ;;
         *)
             echo "packages.sh: there is no package group \"$1\"" >&2

@@ -86,7 +86,7 @@ static void takeLine(const std::wstring& line, PropertyParts& parts, PropertyLis
         parts.inValue = false;
         // Deliberate: a line of one character leaves the mark of the line before it.
         if (line.size() >= 2)
-            parts.isXLine = line.compare(0, 2, L"-X") == 0;
+            parts.isXLine = line[0] == L'-' && line[1] == L'X';
     }
     walkLine(line, parts);
     if (!parts.continued)
