@@ -1,22 +1,15 @@
 """Something else where a file is expected: FIFOs, directories, links, and file systems that take nothing."""
 
 import os
-import pathlib
-import re
 
 import pytest
 
 import namespaces
-from world import (APP, BASE, CONFIG, ECLIPSE, HOME, LOCK, LOG, MAIN, PROPERTIES, TEMP_LOG, USER_PROPERTIES,
-                   WORKSPACE, read, state, temp_logs, tree, until, user_logs)
+from oddities import (ARGS, CONFIG_INI, EXTENSION, HISTORY, JVM_PROPERTIES, PLATFORM_XML, ends_as_promised, grown,
+                      other_ends, replace, whole_log)
+from world import (APP, BASE, ECLIPSE, HOME, LOCK, LOG, MAIN, PROPERTIES, TEMP_LOG, USER_PROPERTIES, WORKSPACE, read,
+                   state, tree, until)
 
-CONFIG_INI = CONFIG + "/config.ini"
-ARGS = CONFIG + "/args.properties"
-UPDATE = CONFIG + "/org.eclipse.update"
-PLATFORM_XML = UPDATE + "/platform.xml"
-HISTORY = WORKSPACE + "/logs/shutdown.log"
-JVM_PROPERTIES = APP + "/rcp/deploy/jvm.properties"
-EXTENSION = APP + "/shared/eclipse/.eclipseextension"
 MARKER = APP + "/rcp/prov.debug/debug.txt"
 SID = WORKSPACE + "/.sid"
 
@@ -25,57 +18,10 @@ FILES = [PROPERTIES, MARKER, LOCK, SID, LOG, TEMP_LOG, EXTENSION, WORKSPACE + "/
          ARGS, CONFIG_INI, BASE + "/config.ini", USER_PROPERTIES, BASE + "/rcpinstall.properties", JVM_PROPERTIES,
          PLATFORM_XML, BASE + "/platform.xml", HISTORY, MAIN, ECLIPSE]
 
-
 # Only these: a device that never comes to an end is read for ever, as a file would be.
 WRITTEN = [LOG, TEMP_LOG, ARGS, HISTORY, MAIN]
 # It is there, so the start waits until it is gone; see the test of the FIFO.
 STAYS = (MARKER, "directory")
-
-
-def grown(world):
-    """An installation with every file, and a user area in which a platform has run."""
-    world.install()
-    world.jvm_properties("vmarg.a=-Da=1")
-    world.write(EXTENSION, "name=x\n")
-    assert world.run().status == 0
-    world.only_platform()
-    world.all_ended()
-
-
-def replace(path, what):
-    """Puts something else in the place of the file."""
-    os.makedirs(os.path.dirname(path), exist_ok=True)
-    if os.path.lexists(path):
-        os.unlink(path)
-    if what == "fifo":
-        os.mkfifo(path)
-    elif what == "directory":
-        os.mkdir(path)
-        pathlib.Path(path, "inside").write_text("kept\n")
-    elif what == "loop":
-        os.symlink(path, path)
-    elif what == "dangling":
-        os.symlink("/mnt/nowhere/at/all", path)
-    elif what == "null":
-        os.symlink("/dev/null", path)
-    elif what == "full":
-        os.symlink("/dev/full", path)
-
-
-def whole_log():
-    """What all logs hold, held lines and time-stamped ones too."""
-    return "".join(read(path) for path in user_logs() + temp_logs() if os.path.isfile(path))
-
-
-def ends_as_promised(world, start, before=0):
-    """Status 0 or 255; a fatal end has left its line in a log, and has started nothing."""
-    assert start.status in (0, 255)
-    started = len(world.platforms()) - before
-    if start.status == 255:
-        assert any(re.match("QVMRL[0-9]{4}E: ", line) for line in whole_log().splitlines())
-        assert started == 0
-    else:
-        assert started == 1 or "Unable to execute " in whole_log()
 
 
 @pytest.mark.parametrize("path, what", [
@@ -115,15 +61,8 @@ def test_what_stands_in_the_place_of_a_file(world, path, what):
 # ---- FIFOs: opening one waits for its other end
 
 WAITS = {PROPERTIES, EXTENSION, ARGS, USER_PROPERTIES, JVM_PROPERTIES, HISTORY}
-
-
-def waits_in_open(start):
-    """It sleeps in the kernel's open of a FIFO."""
-    try:
-        with open("/proc/%d/wchan" % start.pid) as file:
-            return file.read() == "wait_for_partner"
-    except FileNotFoundError:
-        return False
+INSTALLED = [PROPERTIES, EXTENSION, JVM_PROPERTIES, BASE + "/config.ini", BASE + "/rcpinstall.properties",
+             BASE + "/platform.xml"]
 
 
 @pytest.mark.parametrize("path", [path for path in FILES if path != LOCK])
@@ -136,18 +75,20 @@ def test_a_fifo_in_the_place_of_a_file(world, path):
     if path == MARKER:
         until(lambda: "QVMRL0303I" in whole_log(), "the log is open")
         os.unlink(path)  # while it is there, the start waits for its removal
-    waited = False
-    opened = []
-    while start.running():
-        if waits_in_open(start):
-            waited = True
-            # The other end: for what it reads there is a writer that has nothing to say, for what it writes a reader.
-            opened.append(os.open(path, os.O_RDWR | os.O_NONBLOCK))
-            until(lambda: not waits_in_open(start), "the open has come back")
-            os.close(opened.pop())
-    start.wait()
-    assert waited == (path in WAITS)
+    assert other_ends(start, path) == (path in WAITS)
     ends_as_promised(world, start, before=1)
+
+
+@pytest.mark.parametrize("path", INSTALLED)
+def test_a_fifo_in_the_installation_on_a_first_start(world, path):
+    """What the user's files are made from is read."""
+    world.install()
+    world.jvm_properties("vmarg.a=-Da=1")
+    world.write(EXTENSION, "name=x\n")
+    replace(path, "fifo")
+    start = world.start()
+    assert other_ends(start, path)
+    ends_as_promised(world, start)
 
 
 def test_a_fifo_in_the_place_of_the_lock_file(world):
@@ -228,60 +169,7 @@ def test_a_file_system_without_room_for_more_bytes(world, pages):
     world.platforms()
 
 
-# ---- what others have put into /tmp
-
-@pytest.mark.needs_root("files of another user")
-@pytest.mark.parametrize("what", ["link", "file", "directory"])
-@pytest.mark.parametrize("ends", ["well", "badly"])
-def test_the_name_of_the_log_in_tmp_is_taken(world, what, ends):
-    """By another user. Neither the start nor its fatal end depends on it; what a link of another one leads to is written
-    only where the system allows to follow it and the user may write there."""
-    world.install()
-    victim = world.write("/mnt/victim", "precious\n")
-    if what == "link":
-        world.link(TEMP_LOG, victim)
-    elif what == "file":
-        world.write(TEMP_LOG, "theirs\n", 0o644)
-    else:
-        world.folder(TEMP_LOG)
-    world.give(TEMP_LOG, 2000)
-    if ends == "badly":
-        world.properties("rcp.install.id=abc")
-    start = world.run()
-    assert start.status == (0 if ends == "well" else 255)
-    follows = pathlib.Path("/proc/sys/fs/protected_symlinks").read_text() == "0\n"
-    if what == "link" and follows and ends == "badly":
-        # The line of the fatal end: what the required open of that name writes.
-        assert read(victim).rstrip("\n").rpartition("\n")[2].startswith("QVMRL0050E: ")
-    else:
-        assert read(victim) == "precious\n"
-    if what == "file":
-        assert read(TEMP_LOG) == "theirs\n"
-    assert os.path.lexists(TEMP_LOG)  # only its owner can remove it from there
-
-
-@pytest.mark.needs_root("files of another user")
-@pytest.mark.parametrize("what", ["link", "file"])
-def test_the_name_of_the_preload_link_is_taken(world, what):
-    """By another user, who thereby keeps the user from the library: LD_PRELOAD names the other one's link, as required,
-    and a plain file there ends every start."""
-    world.install()
-    library = world.write(APP + "/a library/libx.so", "no library\n")
-    world.base_properties("library.preload=" + library)
-    link = "/tmp/vantor.rcp.anna.abc.libx.so"
-    if what == "link":
-        world.link(link, world.write("/mnt/theirs.so", "no library\n"))
-    else:
-        world.write(link, "no library\n")
-    world.give(link, 2000)
-    start = world.run()
-    if what == "file":
-        world.fatal(start, "QVMRL0184E: Getting command path failed! errno = 22", "Invalid argument")
-        return
-    assert start.status == 0
-    assert world.only_platform().env["LD_PRELOAD"] == link
-    assert os.readlink(link) == "/mnt/theirs.so"
-
+# ---- what a start writes
 
 def test_nothing_else_is_written(world):
     """Outside the user's area, the fixed names in /tmp and the log: nothing, whatever the start is."""

@@ -2,8 +2,8 @@
 
 import pytest
 
-from world import (APP, BASE, CONFIG, HEAD, INSTALL_AREA, PROPERTIES, STARTUP, USER_PROPERTIES, areas, lines, read,
-                   system)
+from world import (APP, BASE, CONFIG, HEAD, INSTALL_AREA, PROPERTIES, STARTUP, USER_PROPERTIES, WORKSPACE, areas,
+                   lines, read, system)
 
 LONGEST_WORD = 128 * 1024 - 1  # bytes that the kernel takes in one word, its end not counted
 LINE = 4095                    # bytes of a line of the log
@@ -60,6 +60,28 @@ def test_a_line_of_a_mebibyte(world, path):
         assert text.replace("\n", "").count("x") == 1 << 20
     if path.endswith("rcpinstall.properties"):
         assert read(USER_PROPERTIES).startswith("x" * 2024 + "\n" + "x" * 2024 + "\n")
+
+
+def test_a_mark_of_a_mebibyte(world):
+    """The shared extension's mark is copied as it is."""
+    world.install()
+    text = "name=" + "x" * (1 << 20) + "\n"
+    world.write(APP + "/shared/eclipse/.eclipseextension", text)
+    assert world.run().status == 0
+    world.only_platform()
+    assert read(WORKSPACE + "/applications/eclipse/.eclipseextension") == text
+
+
+def test_a_history_of_a_mebibyte_in_one_line(world):
+    """It counts as 518 lines of 2024 bytes and one of 144; 101 lines are kept, the new one included."""
+    world.install()
+    history = WORKSPACE + "/logs/shutdown.log"
+    world.write(history, "x" * (1 << 20) + "\n")
+    assert world.run().status == 0
+    world.only_platform()
+    kept = read(history).splitlines()
+    assert kept[:-1] == ["x" * 2024] * 99 + ["x" * 144]
+    assert kept[-1].startswith("Started ")
 
 
 def test_a_value_of_a_mebibyte(world):

@@ -1,6 +1,8 @@
 """A process environment that lacks what every session has."""
 
 import ctypes
+import os
+import re
 
 import pytest
 
@@ -60,6 +62,23 @@ def test_a_strange_home(world, home):
         assert world.platforms() == []
     else:
         world.only_platform()
+
+
+@pytest.mark.parametrize("user", ["", ".", "..", "/", "a/b", "../../../../up", "n" * 256, ("/" + "m" * 200) * 25,
+                                  "u" * 100000, "${rcp.home}", b"\xff", "%n%s%1000000d", "a b'c\"d$(touch /mnt/touched)`x`;\n"])
+def test_a_strange_user(world, user):
+    """A name in the path of the user's area: a defined end, a line in a log when it is a fatal one, and no command."""
+    world.install()
+    start = world.run(env={"USER": user})
+    assert start.status in (0, 255)
+    if start.status == 255:
+        assert re.match("QVMRL[0-9]{4}E: ", world.temp_log().rstrip("\n").rpartition("\n")[2])
+        assert world.platforms() == []
+    else:
+        world.only_platform()
+        world.all_ended()
+        assert world.run(env={"USER": user}).status == 0
+    assert sorted(os.listdir("/mnt")) == ["app", "home"] + (["up"] if user == "../../../../up" else [])
 
 
 @pytest.mark.parametrize("closed", [(0,), (1,), (2,), (0, 1), (1, 2), (0, 2), (0, 1, 2)])
