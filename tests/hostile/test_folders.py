@@ -5,8 +5,8 @@ import shutil
 
 import pytest
 
-from oddities import HISTORY, UPDATE, ends_as_promised, grown, other_ends, replace, whole_log
-from world import CONFIG, HOME, WORKSPACE, read, until
+from oddities import UPDATE, ends_as_promised, grown, other_ends, replace, whole_log
+from world import CONFIG, HOME, WORKSPACE, read
 
 EXIT_DATA = HOME + "/.exitData"
 FOLDERS = [HOME + "/VANTOR", HOME + "/VANTOR/RCP/abc", WORKSPACE, CONFIG, WORKSPACE + "/logs", UPDATE,

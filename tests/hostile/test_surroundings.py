@@ -65,7 +65,8 @@ def test_a_strange_home(world, home):
 
 
 @pytest.mark.parametrize("user", ["", ".", "..", "/", "a/b", "../../../../up", "n" * 256, ("/" + "m" * 200) * 25,
-                                  "u" * 100000, "${rcp.home}", b"\xff", "%n%s%1000000d", "a b'c\"d$(touch /mnt/touched)`x`;\n"])
+                                  "u" * 100000, "${rcp.home}", b"\xff", "%n%s%1000000d",
+                                  "a b'c\"d$(touch /mnt/touched)`x`;\n"])
 def test_a_strange_user(world, user):
     """A name in the path of the user's area: a defined end, a line in a log when it is a fatal one, and no command."""
     world.install()

@@ -94,7 +94,7 @@ def test_the_name_of_the_request_for_a_shutdown_is_taken(world, what):
     if what == "link":
         world.link(REQUEST, victim)
     elif what == "dangling":
-        world.link(REQUEST, "/root/made")
+        world.link(REQUEST, "/var/made")
     elif what == "file":
         world.write(REQUEST, "theirs\n", 0o644)
     elif what == "fifo":
