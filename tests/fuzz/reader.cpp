@@ -1,6 +1,8 @@
-// The properties reader: any file gives pairs, or nothing; each key and value is a text of its own.
+// The properties reader: any file gives the pairs that the same steps give when they are done
+// literally; each key and value is a text of its own.
 #include "launcher/properties/property_file.h"
 #include "tests/fuzz/harness.h"
+#include "tests/fuzz/literal.h"
 
 #include <cwchar>
 
@@ -21,6 +23,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
         if (length > size)
             finding("more text than the file has");
     }
+    if (size < 10000 && literalProperties(place() + "/a.properties") !=
+                            std::vector<std::wstring>(list.begin(), list.end()))
+        finding("other pairs");
     freeProperties(list);
     return 0;
 }

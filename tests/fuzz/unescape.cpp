@@ -1,7 +1,8 @@
-// Unescaping a value: never longer than before, and nothing left of a value without backslashes
-// but its outer spaces.
+// Unescaping a value: what the same steps give when they are done literally; never longer than
+// before, and a value without backslashes loses nothing but its outer spaces.
 #include "launcher/properties/property_text.h"
 #include "tests/fuzz/harness.h"
+#include "tests/fuzz/literal.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
 {
@@ -10,6 +11,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
     FilterValue(after);
     if (after.size() > before.size())
         finding("a value that grows");
+    if (size < 10000 && after != literalValue(before))
+        finding("another value");
     if (before.find(L'\\') == std::wstring::npos) {
         std::wstring trimmed = before;
         trimString(trimmed);
