@@ -167,6 +167,18 @@ def test_a_platform_that_the_system_cannot_start(world):
     assert start.seconds < 5
 
 
+def test_a_platform_that_the_system_cannot_start_and_no_descriptor_is_left(world):
+    """The child says so all the same, and nobody waits for it."""
+    world.install()
+    world.write(ECLIPSE, "no program", 0o755)
+    start = world.run(strace=["-e", "trace=pipe2", "-e", "inject=pipe2:error=EMFILE"])
+    assert read("/dev/shm/strace").count("INJECTED") == 1
+    assert (start.status, world.platforms()) == (0, [])
+    log = world.log()
+    assert sorted(log[log.index(END) + len(END):].splitlines()) == [
+        RELEASED.strip(), "Unable to execute %s : Exec format error" % ECLIPSE]
+
+
 def failed_children():
     """The exit statuses of the processes that have said that they could not be executed. The tracer saw them."""
     said, statuses = set(), []

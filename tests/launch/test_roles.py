@@ -283,6 +283,21 @@ def test_a_lock_file_that_cannot_be_written(world):
         "QVMRL0306I: lock file released @ <time>"))
 
 
+def test_a_lock_file_that_cannot_be_written_from_its_start(world):
+    """Anywhere else the number would not be found; so it is told, and nothing is written."""
+    world.install()
+    world.write(LOCK, "")
+    start = world.run(strace=["-e", "trace=lseek,_llseek", "-P", LOCK, "-e", "inject=lseek,_llseek:error=EIO"])
+    platform = world.only_platform()
+    assert start.status == 0
+    assert read(LOCK) == ""
+    assert read(MAIN) == "%d    " % platform.pid
+    assert world.log().endswith(lines(
+        "QVMRL0133I: ===== End Launch Parameters =====",
+        "QVMRL0051E: Unable to write to platform lock file",
+        "QVMRL0306I: lock file released @ <time>"))
+
+
 @pytest.mark.parametrize("kind", ["folder", "closed"])
 def test_a_pid_file_that_cannot_be_opened(world, kind):
     """Told whether traced or not; the lock file is written all the same."""

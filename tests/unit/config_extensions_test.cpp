@@ -342,6 +342,18 @@ TEST(addConfigExtentionsToArg, TheMarkerFileAddsItsWordsBehindTheProgramPath)
     debugFileExists(L"/nowhere");
 }
 
+TEST(addConfigExtentionsToArg, WithoutAProgramPathTheWordsOfTheMarkerFileBeginAtTheFirstPlace)
+{
+    const TempDir home;
+    home.write("rcp/prov.debug/debug.txt", "");
+    Props props({});
+    const Merge merge(Line({}), props, home.wdir);
+    // The second, third and fourth one each go to position 1, behind the first.
+    EXPECT_EQ(merge.words, (Texts{L"-console", L"-debugFile", L"-pb4l", L"-debug"}));
+    EXPECT_EQ(merge.vector, merge.words);
+    debugFileExists(L"/nowhere");
+}
+
 TEST(addConfigExtentionsToArg, LooksForTheMarkerFileWhenConfigIsTheLastWord)
 {
     const TempDir home;

@@ -11,6 +11,7 @@
 #include <cwchar>
 #include <fcntl.h>
 #include <filesystem>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -326,6 +327,43 @@ TEST(findRCP, LooksAgainAfterASecond)
         EXPECT_EQ(answer, child);
         EXPECT_GE(seconds, 0.99);
         EXPECT_LT(seconds, 5.0);
+    }));
+}
+
+// From now on the process may open only so many files more.
+static void boundDescriptors(pid_t process, int more)
+{
+    const int next = dup(STDERR_FILENO);
+    close(next);
+    struct rlimit limit = {};
+    getrlimit(RLIMIT_NOFILE, &limit);
+    limit.rlim_cur = more < 0 ? limit.rlim_max : static_cast<rlim_t>(next + more);
+    EXPECT_EQ(prlimit(process, RLIMIT_NOFILE, &limit, nullptr), 0);
+}
+
+TEST(findRCP, WhatCannotBeOpenedIsPassedOver)
+{
+    NEEDS_PRIVATE_PROC();
+    EXPECT_TRUE(holdsInPrivateProc([] {
+        const int platform = start("/opt/app/eclipse");
+        ASSERT_GT(platform, 0);
+        // The first time not even /proc can be opened, the second time nothing in it.
+        const pid_t search = getpid();
+        const pid_t helper = fork();
+        if (helper == 0) {
+            waitUntilAsleep(search);
+            boundDescriptors(search, 1);
+            waitUntilAsleepAgain(search);
+            boundDescriptors(search, -1);
+            _exit(0);
+        }
+        boundDescriptors(search, 0);
+        int answer = 0;
+        const double seconds = secondsOf([&] { answer = findRCP(); });
+        EXPECT_EQ(answer, platform);
+        EXPECT_GE(seconds, 1.99);
+        EXPECT_LT(seconds, 6.0);
+        EXPECT_EQ(waitpid(helper, nullptr, 0), helper);
     }));
 }
 
