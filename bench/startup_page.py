@@ -8,7 +8,12 @@ WIDTHS = {"native": "64 bits", "i686": "32 bits"}
 REACHED = {True: "reached", False: "**not reached**"}
 
 # Why a target cannot be reached, by the target's key.
-NOTES = {}
+NOTES = {
+    "warm": "What a start has to touch comes close to the bound by itself in 64 bits, and above it in 32.",
+    "first": "A file of the user is made whole, flushed and renamed, and read again like any other.",
+    "calls": "Some that the least goes without are required: whether a file is there is asked by opening it, the lock "
+             "file and the user's properties are opened more than once, and each line of the log is written at once.",
+}
 
 
 def ratios(result, name, key, limit="limit"):
