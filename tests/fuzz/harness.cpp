@@ -30,6 +30,7 @@ int platformLooks = 0;
 
 extern "C" {
 [[noreturn]] void __real_exit(int status);
+int __real_system(const char* command);
 FILE* __real_fopen(const char* path, const char* mode);
 FILE* __real_fopen64(const char* path, const char* mode);
 int __real_fclose(FILE* stream);
@@ -48,6 +49,8 @@ int __real_fclose(FILE* stream);
 // No shell: whether the lock file names a platform is the target's choice.
 int __wrap_system(const char* command)
 {
+    if (!inside)
+        return __real_system(command);
     if (strncmp(command, "ps h ", 5) == 0 && strlen(command) > 99)
         finding("a process test that is longer than its room");
     return platformLooks-- > 0 ? 0 : 256;
