@@ -13,6 +13,7 @@ import signal
 import time
 
 import namespaces
+from pieces import sanitized
 from world import (APP, BASE, CONFIG, ECLIPSE, HOME, JAVA, LAUNCHER, LOCK, PROPERTIES, RECORDS, USER_PROPERTIES,
                    WORKSPACE, Platform, executable, lines, read, read_bytes, state, temp_logs, tree, until, user_logs)
 
@@ -98,6 +99,11 @@ class Lab:
         self.pieces = pieces
         self.holder = None
         self.env = {"HOME": HOME, "USER": "anna", "LC_ALL": "C.UTF-8", "PATH": "/mnt/bin:/usr/bin:/bin"}
+        self.sanitized = sanitized(pieces)
+        if self.sanitized:
+            # The leak check would trace its own process, which is traced already.
+            self.env["ASAN_OPTIONS"] = os.environ.get("ASAN_OPTIONS", "") + ":detect_leaks=0"
+            self.env["UBSAN_OPTIONS"] = os.environ.get("UBSAN_OPTIONS", "")
         os.mkdir(RECORDS)
         write("/mnt/bin/killall", "#!/bin/sh\n", 0o755)
         write("/mnt/lockdown.so", pieces["lockdown"], 0o755)

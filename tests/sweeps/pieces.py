@@ -30,6 +30,11 @@ def pieces(launcher):
         }
 
 
+def sanitized(built):
+    """Whether the launcher has the address sanitizer."""
+    return b"__asan_init" in built["launcher"]
+
+
 def sources_digest():
     """Twelve digits that stand for the launcher's sources, so that figures are not taken for another tree's."""
     found = hashlib.sha256()

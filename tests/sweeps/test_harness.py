@@ -28,6 +28,7 @@ def _calls_behind_the_mark(pieces):
     return lines[:mark], lines[mark + 1:]
 
 
+@pytest.mark.usefixtures("takes_a_library")
 def test_the_beginning_of_main_is_seen(in_a_world):
     """A library that calls main in the C library's stead leaves a mark: the first call after it is the one that counts
     as the first of main, and none before it looks like that."""

@@ -51,7 +51,7 @@ def _workspace_made_meanwhile(pieces):
     calls = [call for call in sweeps.list_calls_of(lab, scenario) if call.name == "mkdir"]
     last = [call for call in calls if call.path() == WORKSPACE][-1]
     lab.reset()
-    delay = "inject=mkdir:delay_enter=300000:when=%d" % last.number
+    delay = "inject=mkdir:delay_enter=1000000:when=%d" % last.number
     start = lab.start(strace=["-e", "trace=mkdir", "-e", delay])
     until(lambda: os.path.isdir(os.path.dirname(WORKSPACE)), "it makes the folders above")
     os.mkdir(WORKSPACE)

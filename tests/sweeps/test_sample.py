@@ -44,6 +44,7 @@ def test_kills(in_a_world, name):
     assert failures("kills", cases) == []
 
 
+@pytest.mark.usefixtures("takes_a_library")
 def test_allocations_that_fail(in_a_world):
     numbers = spread(list(range(1, in_a_world(memory.count) + 1)), NO_MEMORY)
     cases = in_a_world(memory.fail, numbers)
