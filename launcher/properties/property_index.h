@@ -4,7 +4,7 @@
 // It belongs to the list that was searched last, as it was then: to its length, its first and its
 // last entry. A list that has grown, or another one, is walked at first and then indexed anew; a
 // copy has the same entries, and so the same index. Whoever puts another key into a list, or
-// releases entries, forgets the index.
+// releases a key or the whole list, forgets the index.
 #ifndef LAUNCHER_PROPERTIES_PROPERTY_INDEX_H
 #define LAUNCHER_PROPERTIES_PROPERTY_INDEX_H
 

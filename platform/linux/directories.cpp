@@ -17,36 +17,50 @@ bool createDirectory(const wchar_t* path)
     return mkdir(narrowPath.c_str(), 0775) == 0;
 }
 
-// "/a", "/a/b" and so on, for "/a/b/...".
-static std::vector<std::wstring> levelsOf(const std::wstring& path)
+// The path from the root, with one separator before each of its parts, and where each part ends.
+struct Levels {
+    std::wstring path;
+    std::vector<std::wstring::size_type> ends;
+};
+
+static Levels levelsOf(const std::wstring& path)
 {
-    std::vector<std::wstring> levels;
-    std::wstring soFar;
+    Levels levels;
     std::wstring::size_type at = path.find_first_not_of(L"/\\");
     while (at != std::wstring::npos) {
         const std::wstring::size_type end = path.find_first_of(L"/\\", at);
-        soFar += L'/' + path.substr(at, end - at);
-        levels.push_back(soFar);
+        levels.path += L'/';
+        levels.path.append(path, at, end - at);
+        levels.ends.push_back(levels.path.size());
         at = path.find_first_not_of(L"/\\", end);
     }
     return levels;
 }
 
+static bool createLevel(const Levels& levels, std::vector<std::wstring::size_type>::size_type level)
+{
+    return createDirectory(levels.path.substr(0, levels.ends[level]).c_str());
+}
+
 bool mkdirs(const wchar_t* path)
 {
-    const std::vector<std::wstring> levels = levelsOf(path);
+    const int before = errno;
+    const Levels levels = levelsOf(path);
     bool made = true;
     // From the last level back to one that stands: most levels of a path do, and what stands above
     // that one needs no look.
-    std::vector<std::wstring>::size_type missing = levels.size();
+    std::vector<std::wstring::size_type>::size_type missing = levels.ends.size();
     while (missing > 0) {
-        made = createDirectory(levels[missing - 1].c_str());
+        made = createLevel(levels, missing - 1);
         if (made || errno == EEXIST)
             break;
         --missing;
     }
-    for (; missing < levels.size(); ++missing)
-        made = createDirectory(levels[missing].c_str());
+    // A later line may tell errno as it stands: as if every level had been tried from the root on.
+    if (made)
+        errno = missing > 1 ? EEXIST : before;
+    for (; missing < levels.ends.size(); ++missing)
+        made = createLevel(levels, missing);
     return made;
 }
 

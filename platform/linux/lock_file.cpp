@@ -165,7 +165,8 @@ void populateLockFile(int childPid)
         return;
     populateMainPidFile(static_cast<unsigned long>(childPid));
     const std::string text = std::to_string(childPid) + "          ";
-    // Twice, since a second platform may be started beside one whose number is not there.
+    // Decision: tried twice, since a second platform may be started beside one whose number is not
+    // there. What fails once and not again leaves no line.
     if (rewriteLockFile(text) || rewriteLockFile(text))
         return;
     const ForcedTrace forced;

@@ -1,5 +1,6 @@
 #include "platform/linux/session_end.h"
 
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <dlfcn.h>
@@ -40,11 +41,13 @@ bool shutdown()
     umask(0);
     // One that stands there is opened as it is: some systems refuse to create what another user has
     // created in /tmp, though everybody may write to it. A FIFO there that nobody reads is no place
-    // for a request, and no reason to wait.
-    const int mode = O_WRONLY | O_TRUNC | O_NONBLOCK | O_CLOEXEC;
-    int fd = open(CMD_FILE, mode);
+    // for a request, and no reason to wait. A lease on the file is one, until it is given up.
+    const int mode = O_WRONLY | O_TRUNC | O_CLOEXEC;
+    int fd = open(CMD_FILE, mode | O_NONBLOCK);
+    if (fd < 0 && errno == EWOULDBLOCK)
+        fd = open(CMD_FILE, mode);
     if (fd < 0)
-        fd = open(CMD_FILE, mode | O_CREAT, 0666);
+        fd = open(CMD_FILE, mode | O_CREAT | O_NONBLOCK, 0666);
     if (fd < 0)
         return false;
     // "shutdown" and its zero at offset 0, "1" and its zero at offset 256, zeros elsewhere.

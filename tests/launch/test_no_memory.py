@@ -39,3 +39,16 @@ def test_more_properties_than_memory(world):
             assert "\nQVMRL0004E: newString malloc failed. " in read(path), mebibytes
             os.unlink(path)
     assert set(lines) == {0, 1}
+
+
+def test_a_directory_that_is_deeper_than_any(world):
+    """What its levels take grows with their number, and no faster."""
+    world.install("user")
+    if world.sanitized:
+        pytest.skip("the address sanitizer needs more memory than any bound leaves")
+    deep = "/mnt/home" + 15000 * "/a"
+    start = world.run("--as=%d" % (48 * MEBIBYTE), LAUNCHER, "-data", deep, program="/usr/bin/prlimit")
+    assert (start.status, world.platforms()) == (255, [])
+    log = world.temp_log()
+    assert "\nQVMRL0083E: Unable to create /mnt/home/a/a/a/" in log
+    assert "QVMRL0004E" not in log

@@ -283,6 +283,17 @@ def test_a_lock_file_that_cannot_be_written(world):
         "QVMRL0306I: lock file released @ <time>"))
 
 
+def test_a_lock_file_that_cannot_be_written_for_a_moment(world):
+    """Tried again: the next start has to find the platform."""
+    world.install()
+    world.write(LOCK, "")
+    start = world.run(strace=["-e", "trace=write", "-P", LOCK, "-e", "inject=write:error=EIO:when=1"])
+    platform = world.only_platform()
+    assert start.status == 0
+    assert read(LOCK) == "%d          " % platform.pid
+    assert "QVMRL0051E" not in world.log()
+
+
 def test_a_lock_file_that_cannot_be_written_from_its_start(world):
     """Anywhere else the number would not be found; so it is told, and nothing is written."""
     world.install()

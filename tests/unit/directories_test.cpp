@@ -120,6 +120,19 @@ TEST(mkdirs, IsFalseWhenTheLastLevelCannotBeMade)
     EXPECT_EQ(errno, ENOTDIR);
 }
 
+TEST(mkdirs, LeavesTheReasonOfTheLevelsThatStood)
+{
+    TempDir dir;
+    for (const char* path : {"a", "b/c/d", "b/c/e/f/g"}) {
+        errno = 0;
+        EXPECT_TRUE(mkdirs(dir.wide(path).c_str()));
+        EXPECT_EQ(errno, EEXIST) << path;
+    }
+    errno = EPIPE;
+    EXPECT_TRUE(mkdirs(L"/"));
+    EXPECT_EQ(errno, EPIPE);
+}
+
 TEST(mkdirs, MakesTheLevelsAboveOneThatCannotBeMade)
 {
     TempDir dir;

@@ -327,6 +327,26 @@ TEST(shutdown, DoesNotWaitForSomebodyWhoReadsTheRequest)
     }));
 }
 
+static int leasedRequest = -1;
+
+static void giveUpTheRequest(int)
+{
+    fcntl(leasedRequest, F_SETLEASE, F_UNLCK);
+}
+
+TEST(shutdown, WaitsUntilALeaseOnTheRequestIsGivenUp)
+{
+    NEEDS_PRIVATE_TMP();
+    EXPECT_TRUE(holdsInPrivateTmp([] {
+        Session session;
+        signal(SIGIO, giveUpTheRequest);
+        leasedRequest = open(CMD_FILE, O_RDWR | O_CREAT | O_CLOEXEC, 0666);
+        ASSERT_EQ(fcntl(leasedRequest, F_SETLEASE, F_WRLCK), 0);
+        EXPECT_EQ(answerOf(session, shutdown), 1);
+        EXPECT_EQ(lseek(leasedRequest, 0, SEEK_END), 512);
+    }));
+}
+
 TEST(shutdown, HandsTheRequestToWhoeverReadsAFifo)
 {
     NEEDS_PRIVATE_TMP();
