@@ -1,22 +1,27 @@
 #include "platform/linux/text_source.h"
 
+#include "platform/linux/wide_strings.h"
+
 #include <cerrno>
 
 bool TextSource::readPiece(std::wstring& piece)
 {
     static const std::wstring::size_type LONGEST = 1000;
     piece.clear();
+    const bool shortWay = asciiIsItself();
     int byte = 0;
     while (piece.size() < LONGEST && (byte = getc(file)) != EOF) {
-        const char one = static_cast<char>(byte);
-        wchar_t c = L'\0';
-        const size_t used = mbrtowc(&c, &one, 1, &state);
-        if (used == static_cast<size_t>(-1)) {
-            undecodable = true;
-            return false;
+        auto c = static_cast<wchar_t>(byte);
+        if (!shortWay || byte >= 0x80 || mbsinit(&state) == 0) {
+            const char one = static_cast<char>(byte);
+            const size_t used = mbrtowc(&c, &one, 1, &state);
+            if (used == static_cast<size_t>(-1)) {
+                undecodable = true;
+                return false;
+            }
+            if (used == static_cast<size_t>(-2))
+                continue;
         }
-        if (used == static_cast<size_t>(-2))
-            continue;
         piece += c;
         if (c == L'\n')
             break;

@@ -48,9 +48,7 @@ wchar_t* initMemString(wchar_t* dst, const wchar_t* src)
     return wcscat(dst, src);
 }
 
-// ASCII stands for itself in the encodings that nearly every session has. A text of nothing else
-// is converted without the C library, which takes ten times as long for it.
-static bool asciiIsItself()
+bool asciiIsItself()
 {
     const char* encoding = nl_langinfo(CODESET);
     return strcmp(encoding, "UTF-8") == 0 || strcmp(encoding, "ANSI_X3.4-1968") == 0;

@@ -303,9 +303,13 @@ TEST(copyFile, DecisionADirectoryEndsTheProcess)
 TEST(copyFile, DecisionBytesThatTheLocaleCannotDecodeEndTheProcess)
 {
     TempDir dir;
-    dir.write("from", "good\nbad \xff\ngood\n");
-    EXPECT_TRUE(endsWith([&] { copyFile(dir.wide("from").c_str(), dir.wide("to").c_str()); },
-                         "QVMRL0193E: Did not encounter EOF while copying file contents", EILSEQ));
+    // No beginning of a character; one that goes on with ASCII.
+    for (const char* bad : {"good\nbad \xff\ngood\n", "good\nbad \xe2\x82 good\n"}) {
+        dir.write("from", bad);
+        EXPECT_TRUE(endsWith([&] { copyFile(dir.wide("from").c_str(), dir.wide("to").c_str()); },
+                             "QVMRL0193E: Did not encounter EOF while copying file contents",
+                             EILSEQ));
+    }
 }
 
 // ---- Files that are made once and believed for ever --------------------------------------------
