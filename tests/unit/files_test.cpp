@@ -303,8 +303,8 @@ TEST(copyFile, DecisionADirectoryEndsTheProcess)
 TEST(copyFile, DecisionBytesThatTheLocaleCannotDecodeEndTheProcess)
 {
     TempDir dir;
-    // No beginning of a character; one that goes on with ASCII.
-    for (const char* bad : {"good\nbad \xff\ngood\n", "good\nbad \xe2\x82 good\n"}) {
+    // No beginning of a character; one with ASCII in its middle.
+    for (const char* bad : {"good\nbad \xff\ngood\n", "good\nbad \xe2\x82 \xac good\n"}) {
         dir.write("from", bad);
         EXPECT_TRUE(endsWith([&] { copyFile(dir.wide("from").c_str(), dir.wide("to").c_str()); },
                              "QVMRL0193E: Did not encounter EOF while copying file contents",
