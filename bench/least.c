@@ -1,6 +1,8 @@
 /*
- * The least that a start takes: a dynamic C program in the user's locale that touches the files
- * which a start has to, each of them once, understands none of them, and starts the platform.
+ * The least that a start takes: a dynamic C program in the user's locale that asks the system for
+ * what a start has to ask it for, understands none of it, and starts the platform. What is asked
+ * for more than once is asked for as often: whether a file is there, by opening it; a file that is
+ * there, by opening it again.
  *
  *     least APP WORKSPACE PROGRAM           a warm start
  *     least APP WORKSPACE PROGRAM first     makes the user area
@@ -19,6 +21,7 @@
 #include <unistd.h>
 
 #define BASE "rcp/eclipse/plugins/base/"
+#define JVM "rcp/eclipse/plugins/velmora.demo.jvm/"
 
 enum { PIECE = 4096 };
 
@@ -66,10 +69,18 @@ static void write_text(const char* path, int flags, const char* words)
     close(fd);
 }
 
-/* Whether it is there, which the start does not care about. */
-static void look(const char* path)
+/* Whether a file is there, which the start does not care about. */
+static void ask(const char* path)
 {
-    if (access(path, F_OK) != 0)
+    int fd = open(path, O_RDONLY | O_CLOEXEC);
+    if (fd >= 0)
+        close(fd);
+}
+
+static void ask_folder(const char* path)
+{
+    struct stat entry;
+    if (lstat(path, &entry) != 0)
         return;
 }
 
@@ -101,24 +112,41 @@ static void make_folders(const char* area)
         make(below(area, folders[i]));
 }
 
-/* Whole, and on the disk, before it is there. */
-static void copy(const char* from, const char* area, const char* name)
+static void write_to_disk(const char* path)
 {
-    char whole[PIECE], part[PIECE + 5];
-    snprintf(whole, sizeof whole, "%s/.config/%s", area, name);
-    snprintf(part, sizeof part, "%s.part", whole);
-    read_text(from);
-    int fd = opened(part, O_WRONLY | O_CREAT | O_TRUNC);
+    int fd = opened(path, O_WRONLY | O_CREAT | O_TRUNC);
     put(fd, text);
-    if (fsync(fd) != 0 || close(fd) != 0 || rename(part, whole) != 0)
+    if (fsync(fd) != 0 || close(fd) != 0)
+        exit(1);
+}
+
+/* One of the installation's files becomes the user's: whole, and on the disk, before it is there. */
+static void copy(const char* app, const char* area, const char* folder, const char* name, int again)
+{
+    char from[PIECE], whole[PIECE], part[PIECE + 5], new[PIECE + 4];
+    snprintf(from, sizeof from, "%s/" BASE "config/user/%s", app, name);
+    ask(from);
+    snprintf(from, sizeof from, "%s/" BASE "%s", app, name);
+    snprintf(whole, sizeof whole, "%s/.config/%s%s", area, folder, name);
+    snprintf(part, sizeof part, "%s.part", whole);
+    snprintf(new, sizeof new, "%s.new", whole);
+    ask_folder(whole);
+    read_text(from);
+    write_to_disk(part);
+    if (again) { /* line by line, now that all of it is there */
+        read_text(part);
+        write_to_disk(new);
+        unlink(part);
+    }
+    if (rename(again ? new : part, whole) != 0)
         exit(1);
 }
 
 static void make_copies(const char* app, const char* area)
 {
-    copy(below(app, BASE "config.ini"), area, "config.ini");
-    copy(below(app, BASE "rcpinstall.properties"), area, "rcpinstall.properties");
-    copy(below(app, BASE "platform.xml"), area, "org.eclipse.update/platform.xml");
+    copy(app, area, "", "config.ini", 0);
+    copy(app, area, "", "rcpinstall.properties", 1);
+    copy(app, area, "org.eclipse.update/", "platform.xml", 0);
 }
 
 static pid_t start(const char* program)
@@ -147,11 +175,13 @@ static int begin(const char* app, const char* area, enum kind kind)
     if (readlink("/proc/self/exe", text, PIECE) < 0)
         exit(1);
     read_text(below(app, "rcp/velmora.properties"));
-    look(below(app, "rcp/prov.debug/debug.txt"));
-    look(area);
+    ask(below(app, "rcp/prov.debug/debug.txt"));
+    ask_folder(area);
     if (kind == FIRST)
         make_folders(area);
-    int lock = opened(below(area, ".rcp.lock"), O_RDWR | O_CREAT);
+    close(opened(below(area, ".rcp.lock"), O_RDWR | O_CREAT));
+    int lock = opened(below(area, ".rcp.lock"), O_RDWR);
+    ask(below(area, ".rcp.lock"));
     if (flock(lock, LOCK_EX) != 0 || (read(lock, text, PIECE) > 0) == (kind == FIRST))
         exit(1);
     int pid = kind == FIRST ? 0 : atoi(text);
@@ -159,7 +189,7 @@ static int begin(const char* app, const char* area, enum kind kind)
         exit(1);
     if (kind == BESIDE)
         ask_shell(pid);
-    look(below(area, ".sid"));
+    ask(below(area, ".sid"));
     return lock;
 }
 
@@ -173,22 +203,30 @@ static void tell_start(const char* area)
 
 static int prepare(const char* app, const char* area, enum kind kind)
 {
-    look(below(area, "logs"));
+    ask_folder(below(area, "logs"));
     int log = opened(below(area, "logs/velmora.log"), O_WRONLY | O_CREAT | O_TRUNC);
-    look("/tmp/velmora.log");
-    look(below(area, ".config"));
-    look(below(area, "applications/eclipse/features"));
-    look(below(area, "applications/eclipse/plugins"));
-    look(below(app, "shared/eclipse/.eclipseextension"));
+    put(log, "The words of the start would stand here.\n");
+    ask("/tmp/velmora.log");
+    ask_folder(below(area, ".config"));
+    if (kind != FIRST)
+        read_text(below(area, ".config/rcpinstall.properties"));
+    ask_folder(below(area, "applications/eclipse/features"));
+    ask_folder(below(area, "applications/eclipse/plugins"));
+    ask(below(app, "shared/eclipse/.eclipseextension"));
     if (kind != BESIDE)
         write_text(below(area, ".config/args.properties"), O_TRUNC, "arg0=velmora\n");
-    look(below(area, ".config/config.ini"));
+    ask(below(area, ".config/config.ini"));
+    ask(below(area, ".config/rcpinstall.properties"));
     if (kind == FIRST)
         make_copies(app, area);
     read_text(below(area, ".config/rcpinstall.properties"));
     read_text(below(area, ".config/args.properties"));
-    read_text(below(app, "rcp/eclipse/plugins/velmora.demo.jvm/jvm.properties"));
-    look(below(area, ".config/org.eclipse.update/platform.xml"));
+    put(log, "The path of the VM would stand here.\n");
+    ask(below(app, JVM "jvm.properties"));
+    put(log, "The path of its properties would stand here.\n");
+    read_text(below(app, JVM "jvm.properties"));
+    ask_folder(below(area, ".config/org.eclipse.update"));
+    ask(below(area, ".config/org.eclipse.update/platform.xml"));
     if (kind != BESIDE)
         tell_start(area);
     put(log, "The words of the platform would stand here.\n");

@@ -9,10 +9,9 @@ REACHED = {True: "reached", False: "**not reached**"}
 
 # Why a target cannot be reached, by the target's key.
 NOTES = {
-    "warm": "What a start has to touch comes close to the bound by itself in 64 bits, and above it in 32.",
-    "first": "A file of the user is made whole, flushed and renamed, and read again like any other.",
-    "calls": "Some that the least goes without are required: whether a file is there is asked by opening it, the lock "
-             "file and the user's properties are opened more than once, and each line of the log is written at once.",
+    "warm": "Where the least alone comes to the bound or above it, no launcher can reach it.",
+    "first": "As above.",
+    "calls": "Required calls alone are more. What a program makes that only sets its locale is in the table of counts.",
 }
 
 

@@ -196,12 +196,12 @@ class Start(Contestant):
 
 
 class Least(Contestant):
-    """A program that only touches the files of a start; but for first starts, in a user area of velmora's."""
+    """A program that only makes the calls of a start; but for first starts, in a user area of velmora's."""
 
     def __init__(self, build, scenario):
         self.start = Start(build, scenario, name="least-%s-%s" % (build, scenario))
         app = "/mnt/%s/app" % build
-        super().__init__(self.start.name, "dynamic C program, the files of %s" % SCENARIOS[scenario],
+        super().__init__(self.start.name, "dynamic C program, the calls of %s" % SCENARIOS[scenario],
                          [PARTS + "/least-" + build, app, self.start.workspace, app + ECLIPSE])
         if scenario != "warm":
             self.command.append(scenario)
