@@ -24,7 +24,7 @@ package_group() {
         sanitizers) echo "g++ g++-multilib" ;;
         coverage) echo "g++ python3" ;;
         valgrind) echo "valgrind" ;;
-        fuzz) echo "clang llvm locales" ;;
+        fuzz) echo "clang libclang-rt-dev llvm locales" ;;
         pages) echo "python3 python3-pytest cmake mandoc man-db desktop-file-utils appstream systemd" ;;
         bench) echo "cmake g++ g++-multilib libbenchmark-dev valgrind strace procps dash default-jdk-headless|openjdk-17-jdk-headless" ;;
         packaging) echo "dpkg-dev binutils file lintian debootstrap" ;;
