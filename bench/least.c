@@ -1,8 +1,7 @@
 /*
  * The least that a start takes: a dynamic C program in the user's locale that asks the system for
- * what a start has to ask it for, understands none of it, and starts the platform. What is asked
- * for more than once is asked for as often: whether a file is there, by opening it; a file that is
- * there, by opening it again.
+ * what a start has to ask it for, understands none of it, and starts the platform. Whether a file
+ * is there is asked by opening it; one that is there is opened again to be read.
  *
  *     least APP WORKSPACE PROGRAM           a warm start
  *     least APP WORKSPACE PROGRAM first     makes the user area
@@ -82,6 +81,13 @@ static void ask_folder(const char* path)
     struct stat entry;
     if (lstat(path, &entry) != 0)
         return;
+}
+
+static void ask_program(const char* path)
+{
+    struct stat entry;
+    if (stat(path, &entry) != 0 || !(entry.st_mode & S_IXUSR))
+        exit(1);
 }
 
 static void make(const char* path)
@@ -174,15 +180,15 @@ static int begin(const char* app, const char* area, enum kind kind)
 {
     if (readlink("/proc/self/exe", text, PIECE) < 0)
         exit(1);
+    ask_folder(below(app, "rcp"));
     read_text(below(app, "rcp/velmora.properties"));
     ask(below(app, "rcp/prov.debug/debug.txt"));
     ask_folder(area);
     if (kind == FIRST)
         make_folders(area);
-    close(opened(below(area, ".rcp.lock"), O_RDWR | O_CREAT));
-    int lock = opened(below(area, ".rcp.lock"), O_RDWR);
-    ask(below(area, ".rcp.lock"));
-    if (flock(lock, LOCK_EX) != 0 || (read(lock, text, PIECE) > 0) == (kind == FIRST))
+    int lock = opened(below(area, ".rcp.lock"), O_RDWR | (kind == FIRST ? O_CREAT : 0));
+    if (flock(lock, LOCK_EX) != 0 || access(below(area, ".rcp.lock"), F_OK) != 0 ||
+        (pread(lock, text, PIECE, 0) > 0) == (kind == FIRST))
         exit(1);
     int pid = kind == FIRST ? 0 : atoi(text);
     if (pid > 0 && (kill(pid, 0) == 0) != (kind == BESIDE))
@@ -201,7 +207,7 @@ static void tell_start(const char* area)
     read_text(below(area, "logs/shutdown.log"));
 }
 
-static int prepare(const char* app, const char* area, enum kind kind)
+static int prepare(const char* app, const char* area, const char* program, enum kind kind)
 {
     ask_folder(below(area, "logs"));
     int log = opened(below(area, "logs/velmora.log"), O_WRONLY | O_CREAT | O_TRUNC);
@@ -216,10 +222,11 @@ static int prepare(const char* app, const char* area, enum kind kind)
     if (kind != BESIDE)
         write_text(below(area, ".config/args.properties"), O_TRUNC, "arg0=velmora\n");
     ask(below(area, ".config/config.ini"));
-    ask(below(area, ".config/rcpinstall.properties"));
-    if (kind == FIRST)
+    if (kind == FIRST) {
+        ask(below(area, ".config/rcpinstall.properties"));
         make_copies(app, area);
-    read_text(below(area, ".config/rcpinstall.properties"));
+        read_text(below(area, ".config/rcpinstall.properties"));
+    }
     read_text(below(area, ".config/args.properties"));
     put(log, "The path of the VM would stand here.\n");
     ask(below(app, JVM "jvm.properties"));
@@ -229,6 +236,7 @@ static int prepare(const char* app, const char* area, enum kind kind)
     ask(below(area, ".config/org.eclipse.update/platform.xml"));
     if (kind != BESIDE)
         tell_start(area);
+    ask_program(program);
     put(log, "The words of the platform would stand here.\n");
     return log;
 }
@@ -247,7 +255,7 @@ int main(int argc, char** argv)
         return 1;
     enum kind kind = argc == 4 ? WARM : strcmp(argv[4], "first") == 0 ? FIRST : BESIDE;
     const char *app = argv[1], *area = argv[2];
-    int lock = begin(app, area, kind), log = prepare(app, area, kind);
+    int lock = begin(app, area, kind), log = prepare(app, area, argv[3], kind);
     pid_t child = start(argv[3]);
     if (child < 0)
         return 1;

@@ -11,7 +11,7 @@ REACHED = {True: "reached", False: "**not reached**"}
 NOTES = {
     "warm": "Where the least alone comes to the bound or above it, no launcher can reach it.",
     "first": "As above.",
-    "calls": "Required calls alone are more. What a program makes that only sets its locale is in the table of counts.",
+    "calls": "What a program makes that only sets its locale is in the table of counts.",
 }
 
 

@@ -1,5 +1,6 @@
 #include "diag/SvcDebug_linux.h"
 
+#include "diag/log_stream.h"
 #include "diag/narrow.h"
 #include "diag/self_format.h"
 #include "diag/time_stamps.h"
@@ -9,7 +10,6 @@
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
-#include <fcntl.h>
 #include <unistd.h>
 
 // A formatted line and its terminating zero; a longer one is cut.
@@ -267,15 +267,11 @@ bool enableLogging(const std::wstring& dir)
 {
     const std::wstring name = withSlashes(logFileName(dir));
     const std::string path = narrow(name.c_str());
-    logFILE = fopen(path.c_str(), "w+e");
+    logFILE = openLogStream(path.c_str(), dir == L"/tmp" ? LOG_FOR_EVERYBODY : OWN_LOG);
     if (logFILE == nullptr) {
         fatalErrorA("QVMRL0019E: Could not open %ls for writing!", name.c_str(), GO_ON, WITH_ERRNO);
         return false;
     }
-    fwide(logFILE, -1);
-    // Somebody else may have put a FIFO there: what it does not take is lost, and nobody waits.
-    if (dir == L"/tmp")
-        fcntl(fileno(logFILE), F_SETFL, O_NONBLOCK);
     fprintf(logFILE, "%s\n", logque.c_str());
     fflush(logFILE);
     logque.clear();

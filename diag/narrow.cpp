@@ -2,11 +2,29 @@
 
 #include <cerrno>
 #include <cstdlib>
+#include <cstring>
+#include <cwchar>
 #include <fcntl.h>
+#include <langinfo.h>
 #include <unistd.h>
+
+bool asciiIsItself()
+{
+    const char* encoding = nl_langinfo(CODESET);
+    return strcmp(encoding, "UTF-8") == 0 || strcmp(encoding, "ANSI_X3.4-1968") == 0;
+}
+
+static bool isAscii(const wchar_t* text)
+{
+    while (*text > 0 && *text < 0x80)
+        ++text;
+    return *text == L'\0';
+}
 
 std::string narrow(const wchar_t* text)
 {
+    if (asciiIsItself() && isAscii(text))
+        return std::string(text, text + wcslen(text));
     const size_t length = wcstombs(nullptr, text, 0);
     if (length == static_cast<size_t>(-1))
         return std::string();

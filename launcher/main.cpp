@@ -149,7 +149,6 @@ static void launchEclipse(int argc, wchar_t** argv)
 
 int main(int argc, char** argv)
 {
-    openStandardDescriptors();
     watchChildren();
     std::set_new_handler(endWithoutMemory);
     if (setlocale(LC_CTYPE, "") == nullptr)

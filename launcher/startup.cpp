@@ -61,7 +61,6 @@ struct StartupRun {
     std::wstring workspace;
     std::wstring logLocation;
     std::wstring configuration;
-    std::wstring userPropsPath;
     bool notPluginJvm = true;
 };
 
@@ -134,14 +133,20 @@ static void createConfiguration(StartupRun& run)
     makeUserDirectory(run.configuration, "QVMRL0093E: Unable to create %ls directory.");
 }
 
-static void renewOldUserArea(const StartupRun& run)
+static void renewOldUserArea(StartupRun& run)
 {
     if (userFirstLaunch)
         return;
-    if (isOldRcpInstallId(run.installId, run.configuration))
+    const bool old = isOldRcpInstallId(run.installId, run.configuration, run.userProps);
+    const bool reset = !old && isResetConfig(run.rawArgc, run.rawArgv);
+    if (old)
         createReusableWorkspace(run.workspace, run.configuration);
-    else if (isResetConfig(run.rawArgc, run.rawArgv))
+    if (reset)
         resetWorkspace(run.workspace, run.configuration, run.baseLocation);
+    // Decision: what was read is what is used, as long as the area stays; a trace shows it where it
+    // is used, too.
+    if (old || reset || isTracing())
+        freeProperties(run.userProps);
 }
 
 static void createExtensionDirectories(const StartupRun& run)
@@ -171,13 +176,15 @@ static void recordStartupArguments(const StartupRun& run)
 static void createUserCopies(StartupRun& run)
 {
     createConfigIni(run.configuration, run.baseLocation);
-    run.userPropsPath = createRCPInstallProps(run.workspace, run.configuration, run.baseLocation,
-                                              run.installDir, run.launcherProps);
+    if (!run.userProps.empty())
+        return;
+    const std::wstring path = createRCPInstallProps(
+        run.workspace, run.configuration, run.baseLocation, run.installDir, run.launcherProps);
+    getProperties(path, run.userProps);
 }
 
 static void readUserProperties(StartupRun& run)
 {
-    getProperties(run.userPropsPath, run.userProps);
     insertPropToVmargMap(run.vmargs, run.userProps);
     std::wstring recorded = run.configuration + L"/args.properties";
     convertToOsSeparator(recorded);
@@ -221,7 +228,8 @@ static void readJvmProperties(StartupRun& run)
     std::wstring filePath = path;
     convertToOsSeparator(filePath);
     // Decision: a location is always given; whether it counts as found is whether a file is there.
-    if (!located || !exists(filePath.c_str())) {
+    // That of a JVM in a plug-in has been seen there.
+    if (!located || (run.notPluginJvm && !exists(filePath.c_str()))) {
         const ForcedTrace forced;
         SvcDebugOutW(L"QVMRL0125I: No jvm.properties file was loaded. "
                      L"A default file should be at \"%s\"",

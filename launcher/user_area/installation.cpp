@@ -85,17 +85,15 @@ const wchar_t* getInstallID(const std::wstring& installPropsPath, PropertyList& 
     return findProperty(L"rcp.install.id", props);
 }
 
-bool isOldRcpInstallId(const std::wstring& installId, const std::wstring& configDir)
+bool isOldRcpInstallId(const std::wstring& installId, const std::wstring& configDir,
+                       PropertyList& userProps)
 {
     std::wstring path = configDir + L"/rcpinstall.properties";
     convertToOsSeparator(path);
-    PropertyList userProps;
     if (!getPropertiesIfPresent(path, userProps))
         return false;
     const wchar_t* id = findProperty(L"rcp.install.id", userProps);
-    const bool old = id != nullptr && id[0] != L'\0' && installId != id;
-    freeProperties(userProps);
-    return old;
+    return id != nullptr && id[0] != L'\0' && installId != id;
 }
 
 static const wchar_t* variantDirectory()

@@ -39,8 +39,10 @@ bool startsJvmDirectly();
 const wchar_t* getInstallID(const std::wstring& installPropsPath, PropertyList& props);
 
 /// True when the user's rcpinstall.properties in `configDir` holds an install id that differs from
-/// `installId`; a missing file or id is not old.
-bool isOldRcpInstallId(const std::wstring& installId, const std::wstring& configDir);
+/// `installId`; a missing file or id is not old. What the file holds is added to `userProps`, which
+/// is to be empty.
+bool isOldRcpInstallId(const std::wstring& installId, const std::wstring& configDir,
+                       PropertyList& userProps);
 
 /// The path of an installation's file: "<base>/config/<variant>/<fileName>" when that exists, else
 /// "<base>/<fileName>". The variant is "muservice", "user", "pbuilder" or empty.

@@ -60,6 +60,14 @@ static std::wstring dataWord(const wchar_t* word, const PropertyList& props,
     return out;
 }
 
+// Not by the wide printf of the C library, as std::to_wstring would: nothing else of a usual start
+// needs that.
+static std::wstring decimal(int n)
+{
+    const std::string digits = std::to_string(n);
+    return std::wstring(digits.begin(), digits.end());
+}
+
 void writeStartupArgs(int argc, wchar_t** argv, const std::wstring& configDir,
                       const wchar_t* restartExe, const PropertyList& props,
                       const std::wstring& rcpHome)
@@ -90,11 +98,9 @@ void writeStartupArgs(int argc, wchar_t** argv, const std::wstring& configDir,
             word = executableWord(restartExe);
         else if (i == data)
             word = dataWord(argv[i], props, rcpHome);
-        wchar_t key[10];
-        swprintf(key, 10, L"arg%d", recorded++);
-        record.write(key, word, "QVMRL0020E: Error writing to %ls file.");
+        record.write(L"arg" + decimal(recorded++), word, "QVMRL0020E: Error writing to %ls file.");
     }
-    record.write(L"argc", std::to_wstring(recorded), "QVMRL0116E: Error writing to %ls file.");
+    record.write(L"argc", decimal(recorded), "QVMRL0116E: Error writing to %ls file.");
     std::wstring libraryPath;
     getEnv(L"LD_LIBRARY_PATH", libraryPath);
     record.write(L"com.vantor.rcp.core.internal.librarypath", libraryPath,

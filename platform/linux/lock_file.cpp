@@ -4,6 +4,7 @@
 #include "diag/time_stamps.h"
 #include "platform/linux/argument_vector.h"
 #include "platform/linux/files.h"
+#include "platform/linux/lock_content.h"
 #include "platform/linux/paths.h"
 #include "platform/linux/platform_process.h"
 #include "platform/linux/process.h"
@@ -13,7 +14,6 @@
 #include <cstdio>
 #include <cwchar>
 #include <fcntl.h>
-#include <stdio_ext.h>
 #include <sys/file.h>
 #include <unistd.h>
 
@@ -77,21 +77,41 @@ void locateLockFile(int argc, wchar_t** argv, const std::wstring& workspace,
     lockLockFile(controlFile(workspace, L".sid"), exeName);
 }
 
+static void createLockFile(const char* path)
+{
+    const int fd = open(path, O_RDWR | O_CREAT | O_CLOEXEC, 0600);
+    if (fd >= 0) {
+        close(fd);
+        return;
+    }
+    const int reason = errno;
+    const ForcedTrace forced;
+    SvcDebugOutA("QVMRL0199E: CreateLockFile failed. errno=%d", reason);
+}
+
+// Each start but the first finds one. No file stays open before this one, so its descriptor tells
+// whether the launcher was started with all of the standard ones.
+static FILE* openLockFile(const char* path)
+{
+    FILE* file = fopen(path, "r+");
+    if (file == nullptr || fileno(file) > STDERR_FILENO)
+        return file;
+    fclose(file);
+    openStandardDescriptors();
+    return fopen(path, "r+");
+}
+
 void createAndOpenLockFile()
 {
     std::string path;
     wcstochar(path, lockFilePath.c_str());
-    const int fd = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
-    if (fd < 0) {
-        const int reason = errno;
-        const ForcedTrace forced;
-        SvcDebugOutA("QVMRL0199E: CreateLockFile failed. errno=%d", reason);
-    } else {
-        close(fd);
-    }
     // The platform inherits this stream's descriptor: when the launcher is killed before it has
     // recorded the platform, the lock stays with the platform and no second one can start.
-    lockFILE = fopen(path.c_str(), "r+");
+    lockFILE = openLockFile(path.c_str());
+    if (lockFILE == nullptr) {
+        createLockFile(path.c_str());
+        lockFILE = openLockFile(path.c_str());
+    }
     if (lockFILE == nullptr) {
         fatalErrorA("QVMRL0054E: Error locating platform lock file", EXIT_PROCESS, WITH_ERRNO);
         return;
@@ -138,22 +158,9 @@ void unlockLockFile()
     }
 }
 
-// Writes `text` over the start of the lock file. False when it did not get there.
-static bool rewriteLockFile(const std::string& text)
-{
-    // Anywhere else than at its start the number would stand behind the old one, and not be found.
-    if (fseek(lockFILE, 0, SEEK_SET) != 0)
-        return false;
-    if (fputs(text.c_str(), lockFILE) >= 0 && fflush(lockFILE) == 0)
-        return true;
-    // Nor is it written later, when the process ends and the lock is somebody else's.
-    __fpurge(lockFILE);
-    return false;
-}
-
 void invalidateLockFile()
 {
-    if (rewriteLockFile("              "))
+    if (writeLockContent(fileno(lockFILE), "              "))
         return;
     const ForcedTrace forced;
     SvcDebugOutA("QVMRL0052E: Unable to invalidate platform lock file");
@@ -167,7 +174,8 @@ void populateLockFile(int childPid)
     const std::string text = std::to_string(childPid) + "          ";
     // Decision: tried twice, since a second platform may be started beside one whose number is not
     // there. What fails once and not again leaves no line.
-    if (rewriteLockFile(text) || rewriteLockFile(text))
+    const int fd = fileno(lockFILE);
+    if (writeLockContent(fd, text) || writeLockContent(fd, text))
         return;
     const ForcedTrace forced;
     SvcDebugOutA("QVMRL0051E: Unable to write to platform lock file");
@@ -203,22 +211,10 @@ bool isMainProcessRunning(const std::wstring& exeName)
         return false;
     const ForcedTrace forced;
     SvcDebugOutA("QVMRL0090E: Existing platform lock file found - checking validity.");
-    // Decision: each look sees the file as it is now. A stream keeps its buffer across a seek, so
-    // the buffer is dropped first; otherwise a restart would wait for the old number for ever.
-    fflush(lockFILE);
-    rewind(lockFILE);
-    const int numbers = fscanf(lockFILE, "%ld", &pid);
-    const int reason = errno;
-    const bool atItsEnd = ferror(lockFILE) == 0;
-    // What is left in the buffer goes at once: a child that ends as a launcher would set the shared
-    // position of the file back by that much, in the middle of a later write of ours.
-    fflush(lockFILE);
-    errno = reason;
-    if (numbers == 1)
+    const LockContent content = readLockContent(fileno(lockFILE), pid);
+    if (content == PLATFORM_NUMBER)
         return isPlatformAlive(pid, exeName);
-    // Decision: what cannot be read is no empty file. A platform may run, and a second one must not
-    // be started beside it.
-    if (numbers == EOF && atItsEnd)
+    if (content == NO_DATA)
         SvcDebugOutA("QVMRL0091E: No data in the platform lock file.");
     else
         fatalErrorA("QVMRL0092E: Error reading platform lock file.", EXIT_PROCESS, WITH_ERRNO);

@@ -19,7 +19,8 @@ const int MAX_RETRIES = 10;
 static const char* const OWN_EXECUTABLE = "/proc/self/exe";
 
 // Decision: a launcher that was started without standard descriptors gets empty ones, and so does
-// the platform; otherwise the lock file would be the first file opened, and the platform's output.
+// the platform; otherwise the lock file would be the first file that stays open, and the platform's
+// output.
 void openStandardDescriptors()
 {
     int fd = open("/dev/null", O_RDWR);

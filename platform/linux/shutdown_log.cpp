@@ -97,9 +97,13 @@ static int countLines(FILE* file)
 {
     LineCounter counter;
     char block[4096];
-    size_t size = fread(block, 1, sizeof block, file);
-    while (size > 0 && counter.take(block, block + size))
+    size_t size = sizeof block;
+    // A block that is not full is the last.
+    while (size == sizeof block) {
         size = fread(block, 1, sizeof block, file);
+        if (!counter.take(block, block + size))
+            break;
+    }
     return counter.lines;
 }
 

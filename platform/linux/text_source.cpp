@@ -1,6 +1,6 @@
 #include "platform/linux/text_source.h"
 
-#include "platform/linux/wide_strings.h"
+#include "diag/narrow.h"
 
 #include <cerrno>
 

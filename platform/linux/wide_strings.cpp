@@ -1,12 +1,12 @@
 #include "platform/linux/wide_strings.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "diag/narrow.h"
 
 #include <climits>
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
-#include <langinfo.h>
 
 static wchar_t* allocate(size_t n)
 {
@@ -46,12 +46,6 @@ wchar_t* freeString(void* p)
 wchar_t* initMemString(wchar_t* dst, const wchar_t* src)
 {
     return wcscat(dst, src);
-}
-
-bool asciiIsItself()
-{
-    const char* encoding = nl_langinfo(CODESET);
-    return strcmp(encoding, "UTF-8") == 0 || strcmp(encoding, "ANSI_X3.4-1968") == 0;
 }
 
 size_t decode(wchar_t* out, const char* s, size_t room)

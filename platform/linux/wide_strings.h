@@ -23,10 +23,6 @@ wchar_t* freeString(void* p);
 /// Appends `src` to `dst` and returns `dst`. On a fresh string this is a copy.
 wchar_t* initMemString(wchar_t* dst, const wchar_t* src);
 
-/// True in the encodings that nearly every session has: ASCII stands for itself there, and is
-/// converted without the C library, which takes ten times as long for it.
-bool asciiIsItself();
-
 /// mbstowcs into `out`, which is not null.
 size_t decode(wchar_t* out, const char* s, size_t room);
 

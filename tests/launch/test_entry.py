@@ -177,13 +177,16 @@ def test_what_the_platform_inherits(world):
     assert platform.descriptors[0] == "/dev/null"
 
 
-@pytest.mark.parametrize("closed", [[0], [1], [2], [0, 1, 2]])
+@pytest.mark.parametrize("closed", [[0], [1], [2], [0, 1], [0, 2], [1, 2], [0, 1, 2]])
 def test_closed_descriptors(world, closed):
-    """What the launcher opens may take their numbers; nothing is written to the wrong file."""
+    """What the launcher opens may take their numbers; nothing is written to the wrong file, and what stays open does
+    not take one: the platform inherits empty ones."""
     world.install("user", "jvm.location=" + JAVA)
     assert world.run("-foo", closed=closed).status == 0
     platform = world.only_platform()
     assert platform.argv == HEAD + ["-foo"] + areas() + ["-vm", JAVA] + TAIL
+    assert {platform.descriptors[number] for number in closed} == {"/dev/null"}
+    assert [number for number, target in platform.descriptors.items() if target == LOCK and number < 3] == []
     assert read(LOCK) == "%d          " % platform.pid
     assert read(CONFIG + "/config.ini") == "osgi.bundles=a, b\n"
     assert world.log().startswith(FIRST + LAUNCHER + ', -foo, "\n\nQVMRL0303I: lock file captured @ <time>\n')

@@ -4,8 +4,8 @@ import os
 
 import pytest
 
-from world import (BASE, HEAD, INSTALL_AREA, STARTUP, USER_PROPERTIES, WORKSPACE, areas, lines, read, read_bytes,
-                   system, tree)
+from world import (BASE, HEAD, INSTALL_AREA, LOG, STARTUP, USER_PROPERTIES, WORKSPACE, areas, lines, read, read_bytes,
+                   system, tree, user_logs)
 
 BLOCK = lines("rcp.install.id=abc", "rcp.base.location=${rcp.home}/base", "install.configuration=user")
 MISSING = "QVMRL0008E: Unable to calculate necessary values for user specific rcpinstall.properties file."
@@ -29,6 +29,30 @@ def block(world, *properties):
     world.install("user", *properties)
     assert world.run().status == 0
     return read(USER_PROPERTIES)
+
+
+# ---- the file of a later start
+
+def later_start(world, *words):
+    """A start whose user's file has one more line; how often it was opened, and how often the log has the line."""
+    world.install()
+    assert world.run().status == 0
+    world.all_ended()
+    world.write(USER_PROPERTIES, read(USER_PROPERTIES) + "mine=1\n")
+    before = set(user_logs())
+    assert world.run(*words, strace=["-e", "trace=open,openat", "-P", USER_PROPERTIES]).status == 0
+    log = "".join(read(name) for name in sorted(set(user_logs()) - before) or [LOG])
+    return read("/dev/shm/strace").count("open"), log.count('QVMRL0032I: Prop Line = "mine=1"\n')
+
+
+def test_a_later_start_reads_it_once(world):
+    """For the install id and for all the rest."""
+    assert later_start(world) == (1, 0)
+
+
+def test_a_traced_start_shows_it_in_both_places(world):
+    """So it is read in both; in between it is looked for."""
+    assert later_start(world, "-debug") == (3, 2)
 
 
 # ---- the block

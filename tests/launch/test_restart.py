@@ -117,7 +117,7 @@ def test_an_old_platform_that_does_not_end_is_given_up_after_20_seconds(world):
     world.write("/mnt/w/.rcp.lock", lock(other.pid))
     start = world.start("-restart", "-rcp_old_pid", str(old.pid))
     stuck = world.start("-restart", "-rcp_old_pid", str(other.pid), "-data", "/mnt/w", strace=[
-        "-e", "trace=write", "-P", "/mnt/w/.rcp.lock", "-e", "inject=write:error=ENOSPC"])
+        "-e", "trace=pwrite64", "-P", "/mnt/w/.rcp.lock", "-e", "inject=pwrite64:error=ENOSPC"])
     start.wait(40)
     platform = world.platform(0)
     assert 18.5 < start.seconds < 26

@@ -272,7 +272,7 @@ def test_a_lock_file_that_cannot_be_written(world):
     """Told, and nothing more."""
     world.install()
     world.write(LOCK, "")
-    start = world.run(strace=["-e", "trace=write", "-P", LOCK, "-e", "inject=write:error=ENOSPC"])
+    start = world.run(strace=["-e", "trace=pwrite64", "-P", LOCK, "-e", "inject=pwrite64:error=ENOSPC"])
     platform = world.only_platform()
     assert start.status == 0
     assert read(LOCK) == ""
@@ -287,26 +287,23 @@ def test_a_lock_file_that_cannot_be_written_for_a_moment(world):
     """Tried again: the next start has to find the platform."""
     world.install()
     world.write(LOCK, "")
-    start = world.run(strace=["-e", "trace=write", "-P", LOCK, "-e", "inject=write:error=EIO:when=1"])
+    start = world.run(strace=["-e", "trace=pwrite64", "-P", LOCK, "-e", "inject=pwrite64:error=EIO:when=1"])
     platform = world.only_platform()
     assert start.status == 0
+    assert "INJECTED" in read("/dev/shm/strace")
     assert read(LOCK) == "%d          " % platform.pid
     assert "QVMRL0051E" not in world.log()
 
 
-def test_a_lock_file_that_cannot_be_written_from_its_start(world):
-    """Anywhere else the number would not be found; so it is told, and nothing is written."""
+def test_the_position_of_the_lock_file_is_left_alone(world):
+    """Its descriptor is the platform's, too. The number is read and written at the start of the file all the same."""
     world.install()
-    world.write(LOCK, "")
-    start = world.run(strace=["-e", "trace=lseek,_llseek", "-P", LOCK, "-e", "inject=lseek,_llseek:error=EIO"])
+    world.write(LOCK, "  4194303          ")
+    start = world.run(strace=["-e", "trace=lseek,_llseek,read,write", "-P", LOCK])
     platform = world.only_platform()
     assert start.status == 0
-    assert read(LOCK) == ""
-    assert read(MAIN) == "%d    " % platform.pid
-    assert world.log().endswith(lines(
-        "QVMRL0133I: ===== End Launch Parameters =====",
-        "QVMRL0051E: Unable to write to platform lock file",
-        "QVMRL0306I: lock file released @ <time>"))
+    assert read(LOCK) == ("%d          " % platform.pid).ljust(12) + "       "
+    assert LOCK not in read("/dev/shm/strace")
 
 
 @pytest.mark.parametrize("kind", ["folder", "closed"])

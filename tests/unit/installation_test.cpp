@@ -167,7 +167,8 @@ static bool isOld(const char* userProperties, const wchar_t* installId)
     const TempDir dir;
     if (userProperties != nullptr)
         dir.write("rcpinstall.properties", userProperties);
-    return isOldRcpInstallId(installId, dir.wdir);
+    Props user({});
+    return isOldRcpInstallId(installId, dir.wdir, user.list);
 }
 
 TEST(isOldRcpInstallId, IsTrueForAnotherId)
@@ -195,7 +196,18 @@ TEST(isOldRcpInstallId, ConvertsTheSeparators)
 {
     const TempDir dir;
     dir.write("c/rcpinstall.properties", "rcp.install.id=old\n");
-    EXPECT_TRUE(isOldRcpInstallId(L"new", dir.wdir + L"\\c"));
+    Props user({});
+    EXPECT_TRUE(isOldRcpInstallId(L"new", dir.wdir + L"\\c", user.list));
+}
+
+TEST(isOldRcpInstallId, LeavesWhatWasRead)
+{
+    const TempDir dir;
+    dir.write("rcpinstall.properties", "a=b\nrcp.install.id=same\n");
+    Props user({});
+    EXPECT_FALSE(isOldRcpInstallId(L"same", dir.wdir, user.list));
+    EXPECT_STREQ(findProperty(L"a", user.list), L"b");
+    EXPECT_STREQ(findProperty(L"rcp.install.id", user.list), L"same");
 }
 
 // The variant that is found when each exists, relative to the base.

@@ -346,10 +346,46 @@ TEST(isMainProcessRunning, DecisionWhatCannotBeReadIsNoEmptyFile)
     const Platform platform;
     dir.write(".rcp.lock", platform.number());
     const auto action = [&] {
-        ASSERT_TRUE(makeFail(SYS_read, EIO));
+        ASSERT_TRUE(makeFail(SYS_pread64, EIO));
         locate(dir.wdir);
     };
     EXPECT_TRUE(endsWith(action, "QVMRL0092E: Error reading platform lock file.", EIO));
+}
+
+TEST(isMainProcessRunning, DecisionAFifoIsNothingToReadANumberFromAndNobodyWaits)
+{
+    TempDir dir;
+    ASSERT_EQ(mkfifo(dir.path(".rcp.lock").c_str(), 0600), 0);
+    EXPECT_TRUE(endsWith([&] { locate(dir.wdir); }, "QVMRL0092E: Error reading platform lock file.",
+                         ESPIPE));
+}
+
+TEST(isMainProcessRunning, ZeroBytesAreNoNumber)
+{
+    TempDir dir;
+    dir.write(".rcp.lock", std::string(12, '\0'));
+    EXPECT_FATAL(locate(dir.wdir), "\nQVMRL0092E: Error reading platform lock file. : ");
+    dir.write(".rcp.lock", std::string("  \0 1", 5));
+    EXPECT_FATAL(locate(dir.wdir), "\nQVMRL0092E: Error reading platform lock file. : ");
+}
+
+TEST(isMainProcessRunning, SignsWithoutDigitsAreNoNumber)
+{
+    TempDir dir;
+    for (const char* content : {"-", "+", "- 5", "+-5"}) {
+        dir.write(".rcp.lock", content);
+        EXPECT_FATAL(locate(dir.wdir), "\nQVMRL0092E: Error reading platform lock file. : ");
+    }
+}
+
+TEST(isMainProcessRunning, NumberBehindAnyNumberOfBlanksCounts)
+{
+    const Platform platform;
+    // Around the size of what is read at once.
+    for (const size_t blanks : {4090, 4094, 4095, 4096, 8190, 20000}) {
+        EXPECT_EQ(roleWith(std::string(blanks, ' ') + platform.number()), DAEMON) << blanks;
+        EXPECT_EQ(roleWith(std::string(blanks, '\n')), MAIN) << blanks;
+    }
 }
 
 TEST(isMainProcessRunning, FindsThePlatformWithoutAnotherDescriptor)
@@ -418,6 +454,11 @@ TEST(isMainProcessRunning, DecisionEachLookSeesTheFileAsItIsNow)
     EXPECT_EQ(getPlatformPid(), second.pid);
     dir.write(".rcp.lock", "              ");
     EXPECT_FALSE(isMainProcessRunning(NAME));
+    // Without the blanks that the launcher writes, too.
+    dir.write(".rcp.lock", first.number());
+    EXPECT_TRUE(isMainProcessRunning(NAME));
+    dir.write(".rcp.lock", second.number());
+    EXPECT_TRUE(isMainProcessRunning(NAME));
     EXPECT_EQ(getPlatformPid(), second.pid);
     first.end();
 }
@@ -1028,20 +1069,13 @@ TEST(isMainProcessRunning, NegativeNumberIsLookedUpLikeAnyOther)
     EXPECT_EQ(roleWith("-" + platform.number(), L"another-name"), MAIN);
 }
 
-// The call by which a stream goes to its start.
-#ifdef SYS__llseek
-static const long SEEK_CALL = SYS__llseek;
-#else
-static const long SEEK_CALL = SYS_lseek;
-#endif
-
-TEST(populateLockFile, WritesNothingWhereTheStartCannotBeFound)
+TEST(populateLockFile, WhatCannotBeWrittenIsLogged)
 {
     TempDir dir;
     EXPECT_TRUE(holdsInChild([&] {
         locate(dir.wdir);
         populateLockFile(123456);
-        ASSERT_TRUE(makeFail(SEEK_CALL, EIO));
+        ASSERT_TRUE(makeFail(SYS_pwrite64, EIO));
         EXPECT_EQ(linesOf(false, [] { populateLockFile(7); }),
                   "QVMRL0051E: Unable to write to platform lock file\n");
     }));
