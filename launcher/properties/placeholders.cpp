@@ -1,6 +1,7 @@
 #include "launcher/properties/placeholders.h"
 
 #include "diag/SvcDebug_linux.h"
+#include "launcher/properties/replacement.h"
 #include "platform/linux/environment.h"
 #include "platform/linux/paths.h"
 #include "platform/linux/wide_strings.h"
@@ -12,47 +13,6 @@ static void endInvalidSubstitution(const std::wstring& text)
 {
     fatalErrorA("QVMRL0088E: property substitution is invalid (%ls)", text.c_str(), EXIT_PROCESS,
                 WITH_ERRNO);
-}
-
-// What values may bring in on top of what was asked for, in characters, before the replacing counts
-// as endless.
-static const unsigned long long MOST_BROUGHT_IN = 1ULL << 20;
-
-static bool hasAtEnd(const std::wstring& s, const std::wstring& end)
-{
-    return s.size() >= end.size() && s.back() == end.back() &&
-           s.compare(s.size() - end.size(), end.size(), end) == 0;
-}
-
-bool replaceEvery(const std::wstring& placeholder, const std::wstring& value, std::wstring& s)
-{
-    if (s.find(placeholder) == std::wstring::npos)
-        return true;
-    // Decision: a value that holds its own placeholder would be put in for ever, and so would some
-    // that complete one with what they meet. Values that only grow are replaced to the end.
-    if (value.find(placeholder) != std::wstring::npos)
-        return false;
-    unsigned long long left = MOST_BROUGHT_IN;
-    left += s.size() / placeholder.size() * (value.size() + 1ULL);
-    // The search that begins at the start again each time finds the placeholder that ends first,
-    // since none overlaps itself. `rest` is what has not been looked at, back to front.
-    const std::wstring backwards(value.rbegin(), value.rend());
-    std::wstring rest(s.rbegin(), s.rend());
-    s.clear();
-    while (!rest.empty()) {
-        s += rest.back();
-        rest.pop_back();
-        if (!hasAtEnd(s, placeholder))
-            continue;
-        if (left <= value.size()) {
-            s.append(rest.rbegin(), rest.rend());
-            return false;
-        }
-        left -= value.size() + 1;
-        s.resize(s.size() - placeholder.size());
-        rest += backwards;
-    }
-    return true;
 }
 
 static bool replaceStandard(const std::wstring& placeholder, const std::wstring& value,
@@ -211,6 +171,8 @@ bool replaceAllPlaceholders(const std::wstring& workspace, const std::wstring& r
     if (s.find(L"${") == std::wstring::npos)
         return false;
     bool changed = replaceStdPlaceholders(workspace, rcpHome, s);
+    if (s.find(L"${") == std::wstring::npos)
+        return changed;
     std::wstring resolved = s;
     if (!replaceUserPlaceholders(resolved, props))
         endInvalidSubstitution(resolved);

@@ -16,10 +16,6 @@
 
 #include <string>
 
-/// Replaces every `placeholder`, which cannot overlap itself, in `s` by `value`, as if each search
-/// began at the start of `s`. False, with `s` as far as it came, when that would never end.
-bool replaceEvery(const std::wstring& placeholder, const std::wstring& value, std::wstring& s);
-
 /// Replaces the standard placeholders, in the order above. True when there was one.
 /// Fatal: QVMRL0088E for a value that contains the very placeholder that it replaces, or that
 /// completes one with what it meets, for ever.

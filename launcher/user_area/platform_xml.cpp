@@ -1,7 +1,7 @@
 #include "launcher/user_area/platform_xml.h"
 
 #include "diag/SvcDebug_linux.h"
-#include "launcher/properties/placeholders.h"
+#include "launcher/properties/replacement.h"
 #include "launcher/user_area/first_launch.h"
 #include "launcher/user_area/installation.h"
 #include "platform/linux/files.h"

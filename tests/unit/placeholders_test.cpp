@@ -1,4 +1,5 @@
 #include "launcher/properties/placeholders.h"
+#include "launcher/properties/replacement.h"
 
 #include "tests/unit/support.h"
 
@@ -81,6 +82,47 @@ TEST(replaceEvery, TellsWhetherItCameToAnEnd)
     s = L"a${x}";
     EXPECT_FALSE(replaceEvery(L"${x}", L"-${x}-", s));
     EXPECT_EQ(s, L"a${x}");
+}
+
+// The first placeholder of `s` replaced, again and again. False when it does not end.
+static bool replacedOneByOne(const std::wstring& placeholder, const std::wstring& value,
+                             std::wstring& s)
+{
+    for (int step = 0; step < 1000; ++step) {
+        const std::wstring::size_type found = s.find(placeholder);
+        if (found == std::wstring::npos)
+            return true;
+        s.replace(found, placeholder.size(), value);
+    }
+    return false;
+}
+
+TEST(replaceEvery, DoesAsIfEachSearchBeganAtTheStart)
+{
+    unsigned random = 6;
+    const auto text = [&random](unsigned longest) {
+        std::wstring made;
+        random = random * 1103515245 + 12345;
+        for (unsigned length = random / 65536 % (longest + 1); length > 0; --length) {
+            random = random * 1103515245 + 12345;
+            made += L"${x}-x"[random / 65536 % 6];
+        }
+        return made;
+    };
+    int ended = 0;
+    for (int i = 0; i < 200000; ++i) {
+        const std::wstring value = text(5);
+        const std::wstring given =
+            text(3) + L"${x}" + text(9) + (i % 2 == 0 ? L"${x}" : L"") + text(4);
+        std::wstring expected = given;
+        if (!replacedOneByOne(L"${x}", value, expected))
+            continue;
+        std::wstring s = given;
+        EXPECT_TRUE(replaceEvery(L"${x}", value, s)) << given << " with " << value;
+        EXPECT_EQ(s, expected) << given << " with " << value;
+        ended += s != given;
+    }
+    EXPECT_GT(ended, 150000);
 }
 
 TEST(replaceEvery, ValuesThatOnlyGrowAreReplacedToTheEnd)
