@@ -28,10 +28,12 @@ void getInstallDir(std::wstring& out, int argc, wchar_t** argv)
                     EXIT_PROCESS, WITH_ERRNO);
         return;
     }
-    // What is above a directory is one, too; only above "/rcp" there is no path left.
-    const wchar_t* slash = wcsrchr(dir, L'/');
-    if (slash != nullptr && wcscmp(slash + 1, L"rcp") == 0)
-        out.assign(dir, static_cast<std::wstring::size_type>(slash - dir));
+    wchar_t* slash = wcsrchr(dir, L'/');
+    if (slash != nullptr && wcscmp(slash + 1, L"rcp") == 0) {
+        *slash = L'\0';
+        if (isDirectory(dir))
+            out = dir;
+    }
     freeString(dir);
 }
 

@@ -4,35 +4,37 @@
 #include <cstdlib>
 #include <unistd.h>
 
-static const char* withoutBlanks(const char* text)
+static void dropBlanks(std::string& text)
 {
-    while (isspace(static_cast<unsigned char>(*text)) != 0)
-        ++text;
-    return text;
+    std::string::size_type blanks = 0;
+    while (isspace(static_cast<unsigned char>(text[blanks])) != 0)
+        ++blanks;
+    text.erase(0, blanks);
 }
 
 LockContent readLockContent(int fd, long& pid)
 {
-    char text[4096];
-    off_t at = 0;
-    for (;;) {
+    char block[4096];
+    std::string text; // what has come behind the blanks
+    ssize_t length = 1;
+    // A block further as long as the number may go on there.
+    for (off_t at = 0; length > 0 && text.find_first_not_of("+-0123456789") == std::string::npos;) {
         // Decision: each look sees the file as it is now, which a stream's buffer would not show.
         // What has no place to read from, a FIFO, is refused at once.
-        const ssize_t length = pread(fd, text, sizeof text - 1, at);
-        // Decision: what cannot be read is no empty file. A platform may run, and a second one must
-        // not be started beside it.
-        if (length <= 0)
-            return length == 0 ? NO_DATA : UNREADABLE;
-        text[length] = '\0';
-        const char* start = withoutBlanks(text);
-        if (start == text)
-            break;
-        // Once more from there on: it may go on behind what was read.
-        at += start - text;
+        length = pread(fd, block, sizeof block, at);
+        if (length > 0) {
+            text.append(block, static_cast<size_t>(length));
+            at += length;
+        }
+        dropBlanks(text);
     }
+    // Decision: what cannot be read is no empty file. A platform may run, and a second one must not
+    // be started beside it.
+    if (text.empty())
+        return length == 0 ? NO_DATA : UNREADABLE;
     char* end = nullptr;
-    const long number = strtol(text, &end, 10);
-    if (end == text)
+    const long number = strtol(text.c_str(), &end, 10);
+    if (end == text.c_str())
         return UNREADABLE;
     pid = number;
     return PLATFORM_NUMBER;

@@ -89,8 +89,8 @@ static void createLockFile(const char* path)
     SvcDebugOutA("QVMRL0199E: CreateLockFile failed. errno=%d", reason);
 }
 
-// Each start but the first finds one. No file stays open before this one, so its descriptor tells
-// whether the launcher was started with all of the standard ones.
+// No file stays open before this one, so its descriptor tells whether the launcher was started with
+// all of the standard ones.
 static FILE* openLockFile(const char* path)
 {
     FILE* file = fopen(path, "r+");
@@ -108,6 +108,8 @@ void createAndOpenLockFile()
     // The platform inherits this stream's descriptor: when the launcher is killed before it has
     // recorded the platform, the lock stays with the platform and no second one can start.
     lockFILE = openLockFile(path.c_str());
+    // Decision: made only where it cannot be opened as it stands; each start but the first finds
+    // one.
     if (lockFILE == nullptr) {
         createLockFile(path.c_str());
         lockFILE = openLockFile(path.c_str());

@@ -12,6 +12,7 @@
 #include <cstring>
 #include <ctime>
 #include <cwchar>
+#include <unistd.h>
 
 static const int LONGEST_HISTORY = 200;
 static const wchar_t* const LINE_FORMAT = L"%2024[^\n]\n";
@@ -93,15 +94,16 @@ private:
     }
 };
 
+// Past the stream, which is set back before anything is read from it. A block that is not full is
+// the last one; where a system gives less than there is, the history is cut at a later start.
 static int countLines(FILE* file)
 {
     LineCounter counter;
     char block[4096];
-    size_t size = sizeof block;
-    // A block that is not full is the last.
+    ssize_t size = sizeof block;
     while (size == sizeof block) {
-        size = fread(block, 1, sizeof block, file);
-        if (!counter.take(block, block + size))
+        size = read(fileno(file), block, sizeof block);
+        if (size <= 0 || !counter.take(block, block + size))
             break;
     }
     return counter.lines;

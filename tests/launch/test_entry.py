@@ -178,6 +178,19 @@ def test_what_the_platform_inherits(world):
 
 
 @pytest.mark.parametrize("closed", [[0], [1], [2], [0, 1], [0, 2], [1, 2], [0, 1, 2]])
+def test_closed_descriptors_of_a_later_start(world, closed):
+    """There the lock file is not made, only opened."""
+    world.install()
+    assert world.run().status == 0
+    world.all_ended()
+    assert world.run(closed=closed).status == 0
+    platform = world.platform(1)
+    assert {platform.descriptors[number] for number in closed} == {"/dev/null"}
+    assert [number for number, target in platform.descriptors.items() if target == LOCK and number < 3] == []
+    assert read(LOCK) == "%d          " % platform.pid
+
+
+@pytest.mark.parametrize("closed", [[0], [1], [2], [0, 1], [0, 2], [1, 2], [0, 1, 2]])
 def test_closed_descriptors(world, closed):
     """What the launcher opens may take their numbers; nothing is written to the wrong file, and what stays open does
     not take one: the platform inherits empty ones."""

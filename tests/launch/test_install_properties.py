@@ -35,7 +35,7 @@ def block(world, *properties):
 
 def later_start(world, *words):
     """A start whose user's file has one more line; how often it was opened, and how often the log has the line."""
-    world.install()
+    world.install("user", "config.a.1=-debug")
     assert world.run().status == 0
     world.all_ended()
     world.write(USER_PROPERTIES, read(USER_PROPERTIES) + "mine=1\n")
@@ -50,9 +50,10 @@ def test_a_later_start_reads_it_once(world):
     assert later_start(world) == (1, 0)
 
 
-def test_a_traced_start_shows_it_in_both_places(world):
-    """So it is read in both; in between it is looked for."""
-    assert later_start(world, "-debug") == (3, 2)
+@pytest.mark.parametrize("words", [["-debug"], ["-config", "a"]])
+def test_a_traced_start_shows_it_in_both_places(world, words):
+    """So it is read in both; in between it is looked for. A configuration may ask for the trace, too."""
+    assert later_start(world, *words) == (3, 2)
 
 
 # ---- the block

@@ -69,6 +69,15 @@ def test_the_jvm_of_a_plug_in(world):
             + loading("/mnt/a/eclipse/plugins/jre.x/jvm.properties")) in world.log()
 
 
+def test_the_file_of_a_plug_in_is_looked_for_once(world):
+    """And opened once more, to be read."""
+    place = "/mnt/a/eclipse/plugins/jre.x/"
+    world.install("user", "jvm.location=" + place + "jre/bin/java")
+    world.jvm_properties(*SHOWN, root=place)
+    world.run(strace=["-e", "trace=open,openat", "-P", place + "jvm.properties"])
+    assert read("/dev/shm/strace").count("open") == 2
+
+
 def test_the_home_of_a_plug_ins_jvm_does_not_replace_one_that_is_given(world):
     """It is appended, and the first one counts."""
     world.install("user", "jvm.location=/mnt/a/eclipse/plugins/jre.x/jre/bin/java")

@@ -9,8 +9,9 @@ REQUEST = "/tmp/tzn_shutdown"
 PLATFORM = HEAD + areas() + STARTUP + system(configuration="lockdown") + INSTALL_AREA
 FAILED = "QVMRL0194E: Executing launcher failed! : No such file or directory\n"
 # The child that failed flushes its streams and ends while the launcher is about to write into the lock file.
-AT_ONCE = ["-P", LOCK, "-P", EXIT_DATA, "-e", "trace=open,openat,pwrite64", "-e",
-           "inject=open,openat:delay_enter=50000", "-e", "inject=pwrite64:delay_enter=150000"]
+AT_ONCE = ["-P", LOCK, "-P", EXIT_DATA, "-e", "trace=open,openat,pwrite64,lseek,_llseek", "-e",
+           "inject=open,openat:delay_enter=50000", "-e", "inject=pwrite64:delay_enter=150000", "-e",
+           "inject=lseek,_llseek:delay_exit=150000"]
 
 
 def test_children_that_fail_do_not_disturb_the_lock_file(world):

@@ -16,8 +16,8 @@ END = "QVMRL0130I: ===== End Provisioning Parameters ====="
 RELEASED = "QVMRL0306I: lock file released @ "
 NO_FORK = ["-e", "trace=clone,clone3,fork,vfork", "-e", "inject=clone,clone3,fork,vfork:error=EAGAIN"]
 # The child that failed flushes its streams and ends while the launcher is about to write into the lock file.
-AT_ONCE = ["-P", LOCK, "-e", "trace=flock,pwrite64", "-e", "inject=flock:delay_enter=50000", "-e",
-           "inject=pwrite64:delay_enter=150000"]
+AT_ONCE = ["-P", LOCK, "-e", "trace=flock,pwrite64,lseek,_llseek", "-e", "inject=flock:delay_enter=50000", "-e",
+           "inject=pwrite64:delay_enter=150000", "-e", "inject=lseek,_llseek:delay_exit=150000"]
 
 
 def install(world, *more, configuration="user", level=None, base=()):

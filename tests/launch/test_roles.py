@@ -295,11 +295,33 @@ def test_a_lock_file_that_cannot_be_written_for_a_moment(world):
     assert "QVMRL0051E" not in world.log()
 
 
+def test_a_lock_file_that_takes_a_part_of_the_number(world):
+    """A part is another number: told like a number that is not written."""
+    world.install()
+    world.write(LOCK, "")
+    start = world.run(strace=["-e", "trace=pwrite64", "-P", LOCK, "-e", "inject=pwrite64:retval=3"])
+    assert start.status == 0
+    assert world.log().endswith(lines(
+        "QVMRL0133I: ===== End Launch Parameters =====",
+        "QVMRL0051E: Unable to write to platform lock file",
+        "QVMRL0306I: lock file released @ <time>"))
+
+
+def test_a_lock_file_that_is_there_is_not_made(world):
+    """Where the system refuses to make what is another user's, it is still opened, and nothing is told."""
+    world.install()
+    world.write(LOCK, "4194303          ")
+    start = world.run(strace=["-e", "trace=open,openat", "-P", LOCK])
+    assert start.status == 0
+    opened = [line for line in read("/dev/shm/strace").splitlines() if LOCK in line]
+    assert len(opened) == 1 and "O_RDWR" in opened[0] and "O_CREAT" not in opened[0]
+
+
 def test_the_position_of_the_lock_file_is_left_alone(world):
     """Its descriptor is the platform's, too. The number is read and written at the start of the file all the same."""
     world.install()
     world.write(LOCK, "  4194303          ")
-    start = world.run(strace=["-e", "trace=lseek,_llseek,read,write", "-P", LOCK])
+    start = world.run(strace=["-y", "-e", "trace=lseek,_llseek,read,write", "-P", LOCK])
     platform = world.only_platform()
     assert start.status == 0
     assert read(LOCK) == ("%d          " % platform.pid).ljust(12) + "       "

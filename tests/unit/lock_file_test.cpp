@@ -388,6 +388,18 @@ TEST(isMainProcessRunning, NumberBehindAnyNumberOfBlanksCounts)
     }
 }
 
+TEST(isMainProcessRunning, NumberOfAnyLengthCounts)
+{
+    const Platform platform;
+    const std::string number = platform.number();
+    for (const size_t zeros : {4090, 4095, 4096, 4097, 20000}) {
+        EXPECT_EQ(roleWith(std::string(zeros, '0') + number), DAEMON) << zeros;
+        EXPECT_EQ(roleWith(std::string(zeros, '0') + number + "          "), DAEMON) << zeros;
+        EXPECT_EQ(roleWith(std::string(zeros, '9') + number), MAIN) << zeros;
+    }
+    EXPECT_EQ(roleWith(std::string(4095, ' ') + "+" + number), DAEMON);
+}
+
 TEST(isMainProcessRunning, FindsThePlatformWithoutAnotherDescriptor)
 {
     TempDir dir;
@@ -454,6 +466,7 @@ TEST(isMainProcessRunning, DecisionEachLookSeesTheFileAsItIsNow)
     EXPECT_EQ(getPlatformPid(), second.pid);
     dir.write(".rcp.lock", "              ");
     EXPECT_FALSE(isMainProcessRunning(NAME));
+    EXPECT_EQ(getPlatformPid(), second.pid);
     // Without the blanks that the launcher writes, too.
     dir.write(".rcp.lock", first.number());
     EXPECT_TRUE(isMainProcessRunning(NAME));
