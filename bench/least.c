@@ -138,8 +138,10 @@ static void copy(const char* app, const char* area, const char* folder, const ch
     snprintf(new, sizeof new, "%s.new", whole);
     ask_folder(whole);
     read_text(from);
-    write_to_disk(part);
-    if (again) { /* line by line, now that all of it is there */
+    if (!again)
+        write_to_disk(part);
+    else { /* line by line, now that all of it is there */
+        write_text(part, O_TRUNC, text);
         read_text(part);
         write_to_disk(new);
         unlink(part);

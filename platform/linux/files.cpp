@@ -92,7 +92,10 @@ static const char* copyText(FILE* in, FILE* out)
     return nullptr;
 }
 
-bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
+static const bool ON_DISK = true;
+static const bool IN_MEMORY = false;
+
+static bool copyToPlace(const wchar_t* from, std::wstring& place, const wchar_t* to, bool onDisk)
 {
     FILE* in = nullptr;
     open_file(in, from, L"r");
@@ -111,7 +114,7 @@ bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
         return false;
     }
     const char* trouble = copyText(in, out);
-    if (trouble == nullptr && place != to && !flushToDisk(out))
+    if (trouble == nullptr && onDisk && place != to && !flushToDisk(out))
         trouble = "QVMRL0192E: Encountered error copying file contents";
     const int reason = errno;
     fclose(in);
@@ -129,6 +132,11 @@ bool copyFile(const wchar_t* from, const wchar_t* to)
 {
     std::wstring place = to;
     return copyFileAside(from, place, to);
+}
+
+bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to)
+{
+    return copyToPlace(from, place, to, IN_MEMORY);
 }
 
 // Decision: a file that is believed for ever once it stands is written aside and renamed, so that
@@ -171,7 +179,7 @@ bool publishNewFile(const std::wstring& place, const std::wstring& target)
 bool copyNewFile(const wchar_t* from, const wchar_t* to)
 {
     std::wstring place = placeForNewFile(to);
-    return copyFileAside(from, place, to) && publishNewFile(place, to);
+    return copyToPlace(from, place, to, ON_DISK) && publishNewFile(place, to);
 }
 
 // A buffer for a stream that is closed again by the function that opens it; at most two of these

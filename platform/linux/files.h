@@ -50,8 +50,8 @@ FILE* openNewFile(std::wstring& place, const wchar_t* target, const wchar_t* mod
 /// and errno tells why.
 bool publishNewFile(const std::wstring& place, const std::wstring& target);
 
-/// copyFile to `place`, flushed to the disk when that is not `to`; messages name `to`. Always
-/// returns true.
+/// copyFile to `place`; messages name `to`. Always returns true. What lies aside is not flushed to
+/// the disk: it is to be read again and deleted, and not to be believed.
 bool copyFileAside(const wchar_t* from, std::wstring& place, const wchar_t* to);
 
 /// copyFile for such a file. Fatal: as copyFile, with nothing left behind. False when the whole

@@ -367,3 +367,17 @@ def test_the_steps_come_in_a_fixed_order(world):
     world.run()
     assert world.only_platform().argv == (
         [BASE + "/linux/x86/gone"] + HEAD[1:] + areas() + STARTUP + system() + INSTALL_AREA)
+
+
+def test_what_is_believed_for_ever_is_on_the_disk_before_it_is_there(world):
+    """Nothing else is flushed: what is read again at once and deleted waits for no disk."""
+    world.install()
+    world.write(BASE + "/platform.xml", "<p/>\n")
+    assert world.run(strace=["-y", "-e", "trace=fsync,fdatasync,sync,syncfs,sync_file_range,rename,renameat"]).status == 0
+    calls = [line.partition("(") for line in read("/dev/shm/strace").splitlines() if "(" in line]
+    made = [(name.split()[-1], rest.partition(CONFIG + "/")[2].partition(">" if "sync" in name else '"')[0])
+            for name, _, rest in calls]
+    assert made == [
+        ("fsync", "config.ini.part"), ("rename", "config.ini.part"),
+        ("fsync", "rcpinstall.properties.new"), ("rename", "rcpinstall.properties.new"),
+        ("fsync", "org.eclipse.update/platform.xml.part"), ("rename", "org.eclipse.update/platform.xml.part")]
