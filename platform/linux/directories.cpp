@@ -26,14 +26,20 @@ struct Levels {
 static Levels levelsOf(const std::wstring& path)
 {
     Levels levels;
-    std::wstring::size_type at = path.find_first_not_of(L"/\\");
-    while (at != std::wstring::npos) {
-        const std::wstring::size_type end = path.find_first_of(L"/\\", at);
-        levels.path += L'/';
-        levels.path.append(path, at, end - at);
-        levels.ends.push_back(levels.path.size());
-        at = path.find_first_not_of(L"/\\", end);
+    levels.path.reserve(path.size() + 1);
+    bool inPart = false;
+    for (const wchar_t c : path) {
+        const bool separator = c == L'/' || c == L'\\';
+        if (inPart && separator)
+            levels.ends.push_back(levels.path.size());
+        if (!inPart && !separator)
+            levels.path += L'/';
+        if (!separator)
+            levels.path += c;
+        inPart = !separator;
     }
+    if (inPart)
+        levels.ends.push_back(levels.path.size());
     return levels;
 }
 

@@ -10,16 +10,17 @@ bool TextSource::readPiece(std::wstring& piece)
     piece.clear();
     const bool shortWay = asciiIsItself();
     int byte = 0;
-    while (piece.size() < LONGEST && (byte = getc(file)) != EOF) {
+    while (piece.size() < LONGEST && (byte = getc_unlocked(file)) != EOF) {
         auto c = static_cast<wchar_t>(byte);
-        if (!shortWay || byte >= 0x80 || mbsinit(&state) == 0) {
+        if (!shortWay || byte >= 0x80 || inCharacter) {
             const char one = static_cast<char>(byte);
             const size_t used = mbrtowc(&c, &one, 1, &state);
+            inCharacter = used == static_cast<size_t>(-2);
             if (used == static_cast<size_t>(-1)) {
                 undecodable = true;
                 return false;
             }
-            if (used == static_cast<size_t>(-2))
+            if (inCharacter)
                 continue;
         }
         piece += c;

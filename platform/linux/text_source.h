@@ -24,6 +24,7 @@ struct TextSource {
 private:
     FILE* file;
     mbstate_t state = {};
+    bool inCharacter = false;
     bool undecodable = false;
 };
 
