@@ -137,7 +137,8 @@ def test_a_platform_that_is_no_program(world):
 
 
 @pytest.mark.parametrize("content", [b"", b" " * 14, b"\0" * 20, b"99999999999999999999999999", b"-1          ",
-                                     b"0          ", b"1          ", b"4711\xff\xfe", b"9" * (1 << 20)])
+                                     b"0          ", b"1          ", b"4711\xff\xfe", b"9" * (1 << 24)],
+                         ids=lambda content: repr(content[:30]))
 def test_a_strange_lock_file(world, content):
     """Whatever number it holds, the start is the main process or has its defined end, and the next one works."""
     world.install()

@@ -50,11 +50,13 @@ def test_the_calls_are_counted_as_strace_counts_them():
         'openat(AT_FDCWD, "/mnt/a", O_RDWR|O_CREAT, 0600) = 3</mnt/a>\n'
         '+++ exited with 0 +++\n')
     assert [(call.name, call.number, call.path()) for call in calls] == [
-        ("openat", 2, "/mnt/b"), ("close", 2, "/mnt/b"), ("brk", 2, ""), ("openat", 3, "/mnt/a")]
-    assert calls[2].injection("ENOMEM")[-1] == "inject=brk:retval=0x5000:when=2"
-    assert calls[1].injection("EIO")[-1] == "inject=close:error=EIO:when=2"
-    assert calls[3].injection("KILL")[-1] == "inject=openat:signal=KILL:when=3"
-    assert "ENOSPC" in calls[3].errors() and "EMFILE" in calls[3].errors()
+        ("rt_sigaction", 1, ""), ("openat", 2, "/mnt/b"), ("close", 2, "/mnt/b"), ("brk", 2, ""),
+        ("openat", 3, "/mnt/a")]
+    assert calls[3].injection("ENOMEM")[-1] == "inject=brk:retval=0x5000:when=2"
+    assert calls[2].injection("EIO")[-1] == "inject=close:error=EIO:when=2"
+    assert calls[4].injection("KILL")[-1] == "inject=openat:signal=KILL:when=3"
+    assert "ENOSPC" in calls[4].errors() and "EMFILE" in calls[4].errors()
+    assert calls[0].errors() == []
 
 
 class Finished:
