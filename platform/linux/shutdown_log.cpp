@@ -94,8 +94,9 @@ private:
     }
 };
 
-// Past the stream, which is set back before anything is read from it. A block that is not full is
-// the last one; where a system gives less than there is, the history is cut at a later start.
+// Past the stream, which is set back before anything is read from it.
+// Decision: a block that is not full is the last one, as it is of any file on a disk. A history
+// that comes in smaller pieces, through a FIFO, is not waited for.
 static int countLines(FILE* file)
 {
     LineCounter counter;

@@ -381,3 +381,12 @@ def test_what_is_believed_for_ever_is_on_the_disk_before_it_is_there(world):
         ("fsync", "config.ini.part"), ("rename", "config.ini.part"),
         ("fsync", "rcpinstall.properties.new"), ("rename", "rcpinstall.properties.new"),
         ("fsync", "org.eclipse.update/platform.xml.part"), ("rename", "org.eclipse.update/platform.xml.part")]
+
+
+def test_what_is_written_straight_is_not_flushed(world):
+    """A link that leads nowhere yet is written through: nothing could appear whole there."""
+    world.install()
+    world.link(CONFIG_INI, "/mnt/mine.ini")
+    assert world.run(strace=["-y", "-e", "trace=fsync"]).status == 0
+    assert read("/mnt/mine.ini") == read(BASE + "/config.ini") != ""
+    assert "mine.ini" not in read("/dev/shm/strace") and "rcpinstall.properties.new" in read("/dev/shm/strace")

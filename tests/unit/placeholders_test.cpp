@@ -139,6 +139,18 @@ TEST(replaceEvery, ValuesThatOnlyGrowAreReplacedToTheEnd)
     EXPECT_EQ(s, wanted);
 }
 
+TEST(replaceEvery, WhatWasAskedForHasNoLimitBesideAValueThatCompletesOne)
+{
+    std::wstring s;
+    for (int i = 0; i < 100; ++i)
+        s += L"${x}";
+    s += L"$${x}"; // the value completes this one
+    const std::wstring value = L"{x}" + std::wstring(30000, L'y');
+    EXPECT_TRUE(replaceEvery(L"${x}", value, s));
+    // A hundred and two values; of the last but one its first three characters are gone.
+    EXPECT_EQ(s.size(), 102 * value.size() - 3);
+}
+
 TEST(replaceEvery, ValueThatNeverStopsCompletingAPlaceholderIsFound)
 {
     // With a for "${" and b for "x}" this puts bbaa for ab, and abb grows for ever: abb, bbaab,

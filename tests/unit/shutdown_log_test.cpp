@@ -7,6 +7,8 @@
 #include <cerrno>
 #include <cstdlib>
 #include <ctime>
+#include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 // The lines "Started <first>" to "Started <last>".
@@ -126,6 +128,34 @@ TEST(truncateShutdownLog, EmptyLinesDoNotCount)
 TEST(truncateShutdownLog, ReadThatFailsEndsTheCount)
 {
     EXPECT_EQ(truncated("\n" + history(1, 300)), "\n" + history(1, 300));
+}
+
+TEST(truncateShutdownLog, DirectoryIsNoHistory)
+{
+    TempDir dir;
+    dir.write("shutdown.log/mine", "x");
+    truncateShutdownLog(dir.wdir);
+    EXPECT_EQ(dir.read("shutdown.log/mine"), "x");
+}
+
+TEST(truncateShutdownLog, LineEndAtTheHeadEndsTheCountOfALongHistory)
+{
+    EXPECT_EQ(truncated("\n" + history(1, 3000)), "\n" + history(1, 3000));
+}
+
+TEST(truncateShutdownLog, DecisionABlockThatIsNotFullIsTheLast)
+{
+    TempDir dir;
+    const std::string path = dir.path("shutdown.log");
+    ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
+    // With the other end open, whoever reads on waits.
+    const int fd = open(path.c_str(), O_RDWR | O_CLOEXEC);
+    ASSERT_EQ(write(fd, "Started\nStarted\n", 16), 16);
+    truncateShutdownLog(dir.wdir);
+    close(fd);
+    struct stat entry = {};
+    ASSERT_EQ(lstat(path.c_str(), &entry), 0);
+    EXPECT_TRUE(S_ISFIFO(entry.st_mode));
 }
 
 TEST(truncateShutdownLog, LineOf2024BytesIsOne)
