@@ -168,6 +168,7 @@ def disturbed(lab, scenario, call, what):
             return case
         case["problems"], case["row"] = judge_end(lab, scenario, status, said)
     case["problems"] = case["problems"] + outside.changes(before)
+    lab.platforms()  # what a killed launcher leaves behind has come as far as it can before anything is mended
     scenario.mend(lab)
     case["problems"] = case["problems"] + follow_up(lab, scenario)
     return case
