@@ -183,6 +183,7 @@ static int begin(const char* app, const char* area, enum kind kind)
     if (readlink("/proc/self/exe", text, PIECE) < 0)
         exit(1);
     ask_folder(below(app, "rcp"));
+    ask_folder(app);
     read_text(below(app, "rcp/velmora.properties"));
     ask(below(app, "rcp/prov.debug/debug.txt"));
     ask_folder(area);

@@ -1,8 +1,8 @@
 """The sweeps: which calls there are, what is done at each of them, and what came of it.
 
 A call of the launcher is one that comes after main has begun. main begins with giving SIGCHLD its default action, which
-nothing before it does; test_harness.py holds this. Of the child that becomes the platform the exec is
-made to fail; what other children do is not looked at, since strace does not follow them.
+nothing before it does; test_harness.py holds this. Of the child that becomes the platform the exec is made to fail;
+what other children do is not looked at, since strace does not follow them.
 """
 
 import re
