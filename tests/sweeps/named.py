@@ -35,18 +35,26 @@ def _logged(*numbers):
 RENEWING = ("reset", "renewal")
 OPENING = ("open", "openat")
 
+# Where an error stays, the call that it began with may be another one than the one that matters.
 NAMED = (
+    Named("no-log",
+          "A log that cannot be opened or written takes no line.",
+          "The status alone tells that the start has failed.",
+          "silent", ("lasting",), calls=OPENING + ("write",)),
     Named("platform-not-seen",
           "A lock file of which the system says that it is not there holds no platform, and a process test that fails is "
           "a no.",
           "A second platform starts in the workspace while the first one runs. It takes a file system that denies a file "
           "that is there, or a shell that cannot do its work, at that very moment.",
           "two-platforms", ("errors",), ("daemon",), path=r"\.rcp\.lock|"),
+    Named("platform-not-seen",
+          "", "", "two-platforms", ("lasting",), ("daemon",),
+          calls=OPENING + ("access", "mmap", "mmap2", "mprotect", "clone", "clone3", "vfork")),
     Named("number-not-recorded",
           "When the platform's number cannot be written into the lock file, not at the second try either, that is logged "
           "(QVMRL0051E), and the start goes on.",
           "The next start finds no number and starts a second platform while the first one runs.",
-          "two-platforms", ("errors",), calls=("write", "lseek", "_llseek"), path=r"\.rcp\.lock",
+          "two-platforms", ("errors", "lasting"), calls=("write", "pwrite64", "lseek", "_llseek"), path=r"\.rcp\.lock",
           when=_logged("QVMRL0051E")),
     Named("restart-after-twenty-seconds",
           "A restart waits about 20 seconds for the old platform, then makes its number in the lock file invalid "
@@ -70,11 +78,16 @@ NAMED = (
           NEXT_FATAL + r"|short:\.config/rcpinstall\.properties", ("errors",), calls=("read", "write", "fsync"),
           path=r"\.config/rcpinstall\.properties\.(part|new)",
           when=lambda case: case["call"] == "read" or _logged("QVMRL0001E", "QVMRL0015E")(case)),
+    Named("user-properties-short",
+          "", "", NEXT_FATAL + r"|short:\.config/rcpinstall\.properties", ("lasting",),
+          calls=OPENING + ("read", "write", "fsync")),
     Named("user-properties-copy-left",
           "The results of the removal and the renaming at the end are not looked at.",
           "The plain copy stays beside the user's rcpinstall.properties. Nothing reads it.",
           r"left-short:\.config/rcpinstall\.properties\.part", ("errors",), calls=("unlink",),
           path=r"\.config/rcpinstall\.properties\.part"),
+    Named("user-properties-copy-left",
+          "", "", r"left-short:\.config/rcpinstall\.properties\.part", ("lasting",), calls=("unlink", "rename")),
     Named("platform-xml-short",
           "A failed write into platform.xml is logged (QVMRL0103E), a failed read of the template counts as its end, and "
           "the lines so far stay.",
@@ -82,6 +95,8 @@ NAMED = (
           "short:" + UPDATE + r"platform\.xml", ("errors",), calls=("read", "write", "fsync"),
           path=r".*/platform\.xml(\.part)?",
           when=lambda case: case["call"] == "read" or _logged("QVMRL0103E")(case)),
+    Named("platform-xml-short",
+          "", "", "short:" + UPDATE + r"platform\.xml", ("lasting",), calls=("read", "write", "fsync")),
     Named("words-short-for-now",
           "args.properties is written in its place, by every start but a restart.",
           "After a kill at that moment it is short until the next start writes it. A restart in between believes it.",
@@ -100,22 +115,22 @@ NAMED = (
           "registry.old and bookmarks.xml.old stand in the workspace, each whole. A later reset makes them anew; but when "
           "the registry itself is gone by then, that reset takes a leftover for it. What was being copied ends in .part, "
           "and is not believed.",
-          r"left:(registry|bookmarks\.xml)\.old|left(-short)?:(registry|bookmarks\.xml)\.old\.part", ("errors", "kills"),
+          r"left:(registry|bookmarks\.xml)\.old|left(-short)?:(registry|bookmarks\.xml)\.old\.part", ("errors", "lasting", "kills"),
           RENEWING),
     Named("registry-not-carried-over",
           "A reset moves the configuration away before it puts the registry and the bookmarks back, a file that cannot "
           "be opened counts as absent, and a start without a configuration is a first one.",
           "The new configuration begins without the update registry and the bookmarks. They are kept in .configbak, and "
           "as registry.old and bookmarks.xml.old where they were saved.",
-          "missing:" + UPDATE + r"(registry|bookmarks\.xml)|missing:platform\.xml\.old", ("errors", "kills"), RENEWING),
+          "missing:" + UPDATE + r"(registry|bookmarks\.xml)|missing:platform\.xml\.old", ("errors", "lasting", "kills"), RENEWING),
     Named("older-backup-gone",
           "The older backup of the configuration is cleared before the configuration takes its place.",
           "Until the next reset there is no .configbak. The configuration itself is whole.",
-          r"missing:\.configbak(/.*)?", ("errors", "kills"), RENEWING),
+          r"missing:\.configbak(/.*)?", ("errors", "lasting", "kills"), RENEWING),
     Named("cleared-backup-left",
           "What cannot be removed of an old backup that was moved aside is left without a word.",
           ".configbakdeleteme0001 to 0005 stay until a later reset removes them.",
-          r"left(-short)?:\.configbakdeleteme000[1-5](/.*)?", ("errors", "kills"), RENEWING),
+          r"left(-short)?:\.configbakdeleteme000[1-5](/.*)?", ("errors", "lasting", "kills"), RENEWING),
     Named("log-shared",
           "velmora.log is begun anew by each launcher, and the last line of each is written after the lock was released.",
           "The last line of one launcher may stand in the middle of the next one's log, with zero bytes before it.",

@@ -76,7 +76,8 @@ class Call:
         found = quoted or described
         return found.group(1) if found else ""
 
-    def injection(self, what):
+    def injection(self, what, lasting=False):
+        """`lasting`: from this occurrence on it happens to all of them."""
         if what == "ENOMEM" and self.name == "brk":
             # The kernel answers a break that cannot be had with the one that is.
             what = "retval=" + self.before
@@ -86,7 +87,7 @@ class Call:
             what = "error=" + what
         # Of two injections for a call the later one counts.
         return ["-e", "trace=%s,%s" % (self.name, SLEEPS), "-e", "signal=none", *NO_SLEEP,
-                "-e", "inject=%s:%s:when=%d" % (self.name, what, self.number)]
+                "-e", "inject=%s:%s:when=%d%s" % (self.name, what, self.number, "+" if lasting else "")]
 
 
 class ChildsExec(Call):
@@ -100,7 +101,7 @@ class ChildsExec(Call):
     def errors(self):
         return ["EACCES", "EIO", "EMFILE", "ENOENT", "ENOEXEC", "ENOMEM", "E2BIG", "ETXTBSY"]
 
-    def injection(self, what):
+    def injection(self, what, lasting=False):
         return ["-f", "-P", ECLIPSE, "-e", "trace=execve", "-e", "signal=none", "-e", "inject=execve:error=" + what]
 
 
@@ -122,6 +123,22 @@ def launcher_calls(text):
             last_break = line.rpartition("= ")[2].strip()
     assert begun, "main was not seen to begin"
     return calls
+
+
+def failures(calls):
+    """Each call with each error that fits it."""
+    return [(call, error) for call in calls for error in call.errors()]
+
+
+# A kiosk asks for the end of the session until it gets an answer: a failure that stays keeps it at that.
+LASTING = [name for name in SCENARIOS if name != "kiosk"]
+
+
+def lasting_failures(calls):
+    """The same of errors that stay. Of a child's exec they always do; no system interrupts for ever; and what strace
+    does not let a process close stays open, which no system does either."""
+    return [(call, error) for call, error in failures(calls)
+            if error != "EINTR" and call.name != "close" and not call.of_child]
 
 
 def enter(pieces):
@@ -148,12 +165,12 @@ def list_calls_of(lab, scenario):
     return calls + [ChildsExec()] if scenario.starts_once else calls
 
 
-def disturbed(lab, scenario, call, what):
+def disturbed(lab, scenario, call, what, lasting):
     """One disturbed start in a fresh user area: its case, with what is wrong."""
     lab.reset()
     scenario.spoil(lab)
     before = outside.around()
-    status, said = lab.run(*scenario.words, strace=call.injection(what))
+    status, said = lab.run(*scenario.words, strace=call.injection(what, lasting))
     disturbed_calls = [line for line in read(TRACE).splitlines() if "(INJECTED" in line and call.name + "(" in line]
     case = {"scenario": scenario.name, "call": call.name, "number": call.number, "what": what, "path": call.path(),
             "status": status, "row": "", "lines": lab.error_lines(), "problems": []}
@@ -174,14 +191,14 @@ def disturbed(lab, scenario, call, what):
     return case
 
 
-def disturb(pieces, name, jobs):
+def disturb(pieces, name, jobs, lasting=False):
     """In a world: the cases of (call, what)."""
     lab, scenario = enter(pieces), SCENARIOS[name]
     prepare(lab, scenario)
     cases = []
     for call, what in jobs:
         try:
-            cases.append(disturbed(lab, scenario, call, what))
+            cases.append(disturbed(lab, scenario, call, what, lasting))
         except Exception as trouble:  # what cannot be judged is a failure of that case, not of all
             lab.end_strangers()
             cases.append({"scenario": name, "call": call.name, "number": call.number, "what": what,

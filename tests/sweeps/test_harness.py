@@ -55,6 +55,7 @@ def test_the_calls_are_counted_as_strace_counts_them():
     assert calls[3].injection("ENOMEM")[-1] == "inject=brk:retval=0x5000:when=2"
     assert calls[2].injection("EIO")[-1] == "inject=close:error=EIO:when=2"
     assert calls[4].injection("KILL")[-1] == "inject=openat:signal=KILL:when=3"
+    assert calls[4].injection("EIO", lasting=True)[-1] == "inject=openat:error=EIO:when=3+"
     assert "ENOSPC" in calls[4].errors() and "EMFILE" in calls[4].errors()
     assert calls[0].errors() == []
 

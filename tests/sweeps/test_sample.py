@@ -9,6 +9,7 @@ from named import judge
 from scenarios import SCENARIOS
 
 ERRORS = 40  # disturbed starts of each scenario
+LASTING = 20
 KILLS = 25
 NO_MEMORY = 80
 
@@ -30,10 +31,17 @@ def failures(kind, cases):
 @pytest.mark.parametrize("name", SCENARIOS)
 def test_calls_that_fail(in_a_world, name):
     calls = in_a_world(sweeps.list_calls, name)
-    jobs = spread([(call, error) for call in calls for error in call.errors()], ERRORS)
-    cases = in_a_world(sweeps.disturb, name, jobs)
+    cases = in_a_world(sweeps.disturb, name, spread(sweeps.failures(calls), ERRORS))
     assert len(cases) == ERRORS
     assert failures("errors", cases) == []
+
+
+@pytest.mark.parametrize("name", sweeps.LASTING)
+def test_calls_that_go_on_failing(in_a_world, name):
+    calls = in_a_world(sweeps.list_calls, name)
+    cases = in_a_world(sweeps.disturb, name, spread(sweeps.lasting_failures(calls), LASTING), True)
+    assert len(cases) == LASTING
+    assert failures("lasting", cases) == []
 
 
 @pytest.mark.parametrize("name", SCENARIOS)
