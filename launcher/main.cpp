@@ -17,7 +17,16 @@
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
+#include <exception>
 #include <new>
+
+// The C++ library would say on standard error what it ends the process for, where this one never
+// writes, and would bring along all that it takes to spell a type's name. What it ends for is a
+// defect here; of that the system's own account of an abort tells more.
+void __gnu_cxx::__verbose_terminate_handler()
+{
+    abort();
+}
 
 // Out of memory ends the process as loudly for `new` as for malloc. If even the line cannot be
 // written, only the status is left to tell of it.

@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
 """The executables are what an administrator may rely on: position-independent, everything
-relocated before main, stack protector, fortified calls, and the C library alone.
+relocated before main, stack protector, fortified calls, the C library alone, and none of the
+C++ library's own words, which would go to standard error.
 
     hardening.py [EXECUTABLE...]      (default: native and i686)
 """
@@ -61,6 +62,8 @@ def look(name):
            "no stack protector")
     expect(any(re.match(r"__\w+_chk$", one) and "stack" not in one for one in imports),
            "no fortified call")
+    with open(name, "rb") as file:
+        expect(b"terminate called" not in file.read(), "the C++ library has a word to say on standard error")
     if narrow:
         # In the objects of ours: what the C++ runtime does in the executable is its own business.
         place = os.path.dirname(name)

@@ -237,7 +237,15 @@ BREAKAGES = [
 GOOD_FLAGS = ["-O2", "-fPIE", "-fstack-protector-strong", "-D_FORTIFY_SOURCE=2"]
 GOOD_LINK = ["-pie", "-Wl,-z,relro,-z,now", "-static-libstdc++", "-static-libgcc"]
 PROGRAM = """#include <cstdio>
+#include <cstdlib>
+#include <exception>
 #include <string>
+#ifndef SPEAKS
+void __gnu_cxx::__verbose_terminate_handler()
+{
+    abort();
+}
+#endif
 int main(int argc, char** argv)
 {
     char text[64];
@@ -260,6 +268,7 @@ EXECUTABLES = [
     (GOOD_FLAGS, GOOD_LINK[:2], "it needs the C library alone"),
     (GOOD_FLAGS, [*GOOD_LINK, "-Wl,-rpath,/opt"], "a search path of its own"),
     (GOOD_FLAGS, [*GOOD_LINK, "-Wl,-z,execstack"], "the stack can be executed"),
+    ([*GOOD_FLAGS, "-DSPEAKS"], GOOD_LINK, "a word to say on standard error"),
 ]
 
 failures = []
