@@ -77,7 +77,7 @@ static pid_t spawnChild(char** args)
 {
     if (args[0] == nullptr)
         return -1;
-    alignas(16) char stack[32768];
+    alignas(16) char stack[8192];
     Execution execution = {args, false};
     const pid_t child =
         clone(execute, stack + sizeof stack, CLONE_VM | CLONE_VFORK | SIGCHLD, &execution);

@@ -187,9 +187,9 @@ bool copyNewFile(const wchar_t* from, const wchar_t* to)
 static void giveBuffer(FILE* fp)
 {
     static char buffers[4][4096];
-    static unsigned next = 0;
-    setvbuf(fp, buffers[next], _IOFBF, sizeof buffers[next]);
-    next = (next + 1) % 4;
+    static auto* next = buffers;
+    setvbuf(fp, *next, _IOFBF, sizeof *next);
+    next = next == buffers + 3 ? buffers : next + 1;
 }
 
 static void openStream(FILE*& fp, const wchar_t* path, const wchar_t* mode, int orientation)
