@@ -107,6 +107,8 @@ bool addVmToCommandLine(const PropertyList& props, const PropertyList& launcherP
     if (given == nullptr)
         return false;
     std::wstring vmPath = given;
+    // Decision: the plain ending. With endsIn, whose arithmetic takes a text that is one character
+    // shorter than the ending for it, a VM called "jvm" would be a library.
     const bool isLibrary = hasEnding(vmPath, L".ee") || hasEnding(vmPath, L".dll");
     if (!isLibrary) {
         if (console)

@@ -266,6 +266,12 @@ TEST(addVmToCommandLine, PassesALibraryOnAsItIs)
               (Texts{L"-vm", L"/jvm/java.EE"}));
 }
 
+TEST(addVmToCommandLine, DecisionANameShorterThanTheEndingIsNoLibrary)
+{
+    for (const wchar_t* name : {L"jvm", L"vm", L"ee", L"dll", L"x.e"})
+        EXPECT_EQ(vmWords({L"vm", name}, Line({L"velmora"}), false), (Texts{L"-vm", name}));
+}
+
 TEST(addVmToCommandLine, MakesALibraryTheProgramOfAService)
 {
     eConfig = CONFIG_SERVICE;
