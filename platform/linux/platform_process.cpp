@@ -53,13 +53,18 @@ static std::string platformTest(long pid, const std::wstring& exeName)
 }
 
 // False when no shell could be had: of that the C library tells in errno alone, its result is that
-// of a shell that has found no command.
+// of a shell that has found no command. A shell that ran leaves errno as it was, for the reason
+// behind a later line.
 static bool runShell(const std::string& command, int& status)
 {
+    const int before = errno;
     errno = 0;
     // The shell is required here: packages depend on ps.
     status = system(command.c_str());
-    return errno != EAGAIN && errno != ENOMEM;
+    const bool had = errno != EAGAIN && errno != ENOMEM;
+    if (errno == 0)
+        errno = before;
+    return had;
 }
 
 bool isPlatformAlive(long pid, const std::wstring& exeName)

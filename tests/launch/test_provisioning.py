@@ -6,8 +6,8 @@ import shutil
 
 import pytest
 
-from world import (CONFIG, ECLIPSE, HEAD, INSTALL_AREA, JAVA, LOCK, LOG, MAIN, STARTUP, USER_PROPERTIES, WORKSPACE,
-                   areas, lines, read, system, tree, until, user_logs)
+from world import (CONFIG, ECLIPSE, HEAD, INSTALL_AREA, JAVA, LOCK, LOG, MAIN, STARTUP, TEMP_LOG, USER_PROPERTIES,
+                   WORKSPACE, areas, lines, read, system, tree, until, user_logs)
 
 LEVEL = "provisioning.manifest.version="
 PROVISIONING = ["provisioning=true", "provisioning.application=org.prov", LEVEL + "2"]
@@ -441,6 +441,17 @@ def test_the_installers_word_alone_is_refused_as_well(world):
     assert world.run("-provManifest").status == 255
     assert len(world.platforms()) == 1
     assert "QVMRL0122E: Attempting to install while process %d is running." % platform.pid in read(LOG)
+
+
+def test_the_question_for_the_platform_is_not_the_reason(world):
+    """The reason is errno as it stands: that of the last thing that was missing, long before the shell was asked."""
+    settled(world)
+    world.plan("wait")
+    world.run()
+    world.write(TEMP_LOG, "of an earlier start\n")
+    assert world.run(*INSTALLER).status == 255
+    assert read(LOG).endswith(" is running. : No such file or directory\n")
+    assert not os.path.exists(TEMP_LOG)
 
 
 def test_an_installers_word_of_an_extension_is_refused_as_well(world):
