@@ -74,6 +74,7 @@ static void readLauncherProperties(StartupRun& run)
 {
     getInstallDir(run.installDir, run.rawArgc, run.rawArgv);
     run.launcherPropsPath = run.installDir + L"/rcp/velmora.properties";
+    convertToOsSeparator(run.launcherPropsPath);
     getProperties(run.launcherPropsPath, run.launcherProps);
     mergeExtensions(run, run.rawArgc, run.rawArgv);
     setDebug(isDebug(run.argc, run.argv));

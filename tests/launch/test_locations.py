@@ -204,6 +204,16 @@ def test_the_installation_may_lie_anywhere_and_the_launcher_have_any_name(world)
     assert "-Drcp.home=/mnt/opt ä" in argv
 
 
+def test_an_installation_below_a_folder_with_a_backslash_is_not_found(world):
+    """A backslash is a separator wherever a path is used; the message says where the file was looked for. Nothing is
+    made in the user's area."""
+    world.install()
+    os.rename(APP, "/mnt/a\\b")
+    world.fatal(world.run(program="/mnt/a\\b/rcp/velmora"), "QVMRL0096E: Unable to load /mnt/a/b/rcp/velmora.properties "
+                "file!", "No such file or directory")
+    assert not os.path.exists(HOME) or os.listdir(HOME) == []
+
+
 def test_an_installation_that_is_taken_away_meanwhile(world):
     """The folder of the running executable is gone before the launcher asks for it."""
     world.install()
