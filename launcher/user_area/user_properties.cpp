@@ -49,10 +49,13 @@ std::wstring createRCPInstallProps(const std::wstring& workspaceDir, const std::
         return userPath;
     // Decision: the plain copy is made aside, so that a launcher killed before the rewriting is
     // done leaves no copy that a later start believes. Without the required values the rewriting
-    // ends the process and leaves the plain copy in place, so then it is made there.
-    std::wstring copy = hasRequiredValues(props) ? placeForNewFile(userPath) : userPath;
+    // ends the process and leaves the plain copy in place, so then it gets its name before, whole.
     const std::wstring source = getCoreFileLocation(baseLocation, L"rcpinstall.properties");
-    if (!copyFileAside(source.c_str(), copy, userPath.c_str()))
+    const bool complete = hasRequiredValues(props);
+    std::wstring copy = complete ? placeForNewFile(userPath) : userPath;
+    const bool copied = complete ? copyFileAside(source.c_str(), copy, userPath.c_str())
+                                 : copyNewFile(source.c_str(), userPath.c_str());
+    if (!copied)
         fatalErrorA("QVMRL0022E: Unable to copy rcpinstall.properties to the user directory.",
                     EXIT_PROCESS, WITH_ERRNO);
     std::wstring newPath = userPath + L".new";

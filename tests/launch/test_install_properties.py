@@ -273,6 +273,17 @@ def test_a_missing_configuration_word_ends_the_first_start(world):
     assert read(USER_PROPERTIES + ".new") == "b=2\n"
 
 
+def test_without_a_required_value_a_copy_that_fails_leaves_nothing_either(world):
+    """So the next start fails for the same reason, and not for what the first one left."""
+    world.install(None)
+    world.write(BASE + "/rcpinstall.properties", b"a=1\n\xa9")
+    for _ in range(2):
+        assert world.run().status == 255
+        assert "\nQVMRL0193E: " in read(LOG)
+        assert not os.path.lexists(USER_PROPERTIES)
+        assert not os.path.lexists(USER_PROPERTIES + ".part")
+
+
 def test_a_new_file_left_by_an_earlier_start_is_replaced(world):
     world.install()
     world.write(USER_PROPERTIES + ".new", "left=1\n" * 100)

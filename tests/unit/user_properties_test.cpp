@@ -275,6 +275,32 @@ TEST(createRCPInstallProps, EndsWhenARequiredValueIsMissing)
     }
 }
 
+// What is left of REQUIRED without the configuration.
+static const std::initializer_list<const wchar_t*> INCOMPLETE = {L"rcp.install.id", L"abc",
+                                                                 L"rcp.base.location", L"/base"};
+
+TEST(createRCPInstallProps, WithoutARequiredValueAPlainCopyThatCannotBeMadeLeavesNothing)
+{
+    const World world;
+    world.dir.write("base/rcpinstall.properties", "a=1\n\xa9");
+    EXPECT_TRUE(fatalLineHolds([&] { world.create(Props(INCOMPLETE)); },
+                               "QVMRL0193E: Did not encounter EOF while copying file contents"));
+    EXPECT_TRUE(fs::is_empty(world.dir.path("ws/.config")));
+}
+
+TEST(createRCPInstallProps, EndsWhenThePlainCopyCannotGetItsName)
+{
+    const World world;
+    world.dir.write("base/rcpinstall.properties", "a=1\n");
+    EXPECT_TRUE(endsWith(
+        [&] {
+            ASSERT_TRUE(makeFail(SYS_rename, EIO));
+            world.create(Props(INCOMPLETE));
+        },
+        "QVMRL0022E: Unable to copy rcpinstall.properties to the user directory.", EIO));
+    EXPECT_TRUE(fs::is_empty(world.dir.path("ws/.config")));
+}
+
 // The name of the first file in `dir` that somebody has written and closed, while `child` runs.
 static std::string firstWritten(int watch)
 {
