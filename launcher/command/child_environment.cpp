@@ -3,6 +3,7 @@
 #include "diag/SvcDebug_linux.h"
 #include "platform/linux/environment.h"
 #include "platform/linux/files.h"
+#include "platform/linux/paths.h"
 #include "platform/linux/process.h"
 #include "platform/linux/wide_strings.h"
 
@@ -145,8 +146,10 @@ void setPreload(const std::wstring& preloadPath, const std::wstring& installId)
         return;
     }
     SvcDebugOutW(L"setPreload():found property: library.preload=%s", preloadPath.c_str());
-    if (exists(preloadPath.c_str()))
-        preloadThroughLink(preloadPath, installId);
+    std::wstring library = preloadPath;
+    convertToOsSeparator(library);
+    if (exists(library.c_str()))
+        preloadThroughLink(library, installId);
     std::wstring inForce;
     getEnv(L"LD_PRELOAD", inForce);
     SvcDebugOutW(L"setPreload():getenv LD_PRELOAD=%s", inForce.c_str());

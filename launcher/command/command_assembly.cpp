@@ -66,6 +66,7 @@ static void buildProvisioningCommand(const Sources& from, bool userProvisioning)
     addMainOptions(from);
     const wchar_t* application = findProperty(L"provisioning.application", from.launcherProps);
     addArgToCommandLine(L"-application", true);
+    // Decision: an absent one is an empty word, so that the platform takes no other word for it.
     addArgToCommandLine(application == nullptr ? L"" : application, true);
     if (userProvisioning)
         addArgToCommandLine(L"-userProvLaunch", true);

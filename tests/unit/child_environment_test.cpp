@@ -311,6 +311,27 @@ TEST(setPreload, ReachesAPathWithABlankThroughANewLink)
     EXPECT_EQ(ended.log, preload.names() + preload.created() + preload.set());
 }
 
+TEST(setPreload, TurnsTheBackslashesOfAPathWithABlank)
+{
+    SKIP_WITHOUT_PRIVATE_TMP();
+    Preload preload;
+    preload.makeLibrary();
+    preload.library = preload.dir.path("my lib\\libx.so");
+    const Ended ended = preload.after([] {});
+    EXPECT_EQ(ended.result, preload.link + " -> " + preload.dir.path("my lib/libx.so"));
+    EXPECT_EQ(ended.log, preload.names() + preload.created() + preload.set());
+}
+
+TEST(setPreload, HandsAPathWithoutABlankOnAsItIs)
+{
+    const TempDir dir;
+    const Ended ended = runAside(dir, true, [] {
+        setPreload(L"\\opt\\libx.so", L"1234");
+        return variable("LD_PRELOAD");
+    });
+    EXPECT_EQ(ended.result, "\\opt\\libx.so");
+}
+
 TEST(setPreload, KeepsALinkThatLeadsToTheLibrary)
 {
     SKIP_WITHOUT_PRIVATE_TMP();

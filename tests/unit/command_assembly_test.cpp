@@ -203,6 +203,15 @@ TEST(getUserCmdString, AUsersProvisioningRunHasItsFlag)
               expectedProvisioning(assembly, {L"-userProvLaunch"}));
 }
 
+TEST(getUserCmdString, DecisionAnAbsentProvisioningApplicationIsAnEmptyWord)
+{
+    Assembly assembly;
+    assembly.launcher.list[2][0] = L'x'; // it has another key now
+    Texts expected = expectedProvisioning(assembly, {L"-userProvLaunch"});
+    *std::find(expected.begin(), expected.end(), L"prov.app") = L"";
+    EXPECT_EQ(provisioningCommand(assembly, true), expected);
+}
+
 TEST(getUserCmdString, AProvisioningRunIsNativeAndHasNoDaemonWords)
 {
     Assembly assembly;
