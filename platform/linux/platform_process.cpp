@@ -69,9 +69,10 @@ static bool runShell(const std::string& command, int& status)
 
 bool isPlatformAlive(long pid, const std::wstring& exeName)
 {
-    // A number that no process can have is a dead one, also where pid_t is narrower than long.
-    // Neither for 0 nor without a name could the shell find anything but an error to print. A
+    // A number that no process can have is a dead one, also where pid_t is narrower than long. A
     // negative number is looked up like any other: ps takes it for a session.
+    // Decision: 0 and an empty name are a no without a shell, which could only print an error, on
+    // this process's own standard output.
     std::string name;
     if (pid == 0 || pid > INT_MAX || pid < -INT_MAX || wstrtocs(name, exeName) <= 0)
         return false;

@@ -994,7 +994,7 @@ static std::string outputOf(const std::function<void()>& action)
     return dir.read("output");
 }
 
-TEST(isMainProcessRunning, NothingIsPrintedForWhatCannotBeFound)
+TEST(isMainProcessRunning, DecisionNothingIsPrintedForWhatCannotBeFound)
 {
     Platform platform;
     EXPECT_EQ(outputOf([] { EXPECT_EQ(roleWith("0"), MAIN); }), "");
