@@ -49,6 +49,7 @@ void updateShutdownLog(const std::wstring& logDir)
                     WITH_ERRNO);
         return;
     }
+    // Decision: what the system would not take is not written, though it fits the stream's buffer.
     if (!putWide(file, L"Started " + started) || fflush(file) != 0)
         fatalErrorA("QVMRL0118E: Error writing to %ls file.", path.c_str(), EXIT_PROCESS,
                     WITH_ERRNO);
