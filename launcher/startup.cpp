@@ -74,6 +74,7 @@ static void readLauncherProperties(StartupRun& run)
 {
     getInstallDir(run.installDir, run.rawArgc, run.rawArgv);
     run.launcherPropsPath = run.installDir + L"/rcp/velmora.properties";
+    // Decision: as every path; an installation below a folder with a backslash is not found.
     convertToOsSeparator(run.launcherPropsPath);
     getProperties(run.launcherPropsPath, run.launcherProps);
     mergeExtensions(run, run.rawArgc, run.rawArgv);

@@ -146,6 +146,7 @@ void setPreload(const std::wstring& preloadPath, const std::wstring& installId)
         return;
     }
     SvcDebugOutW(L"setPreload():found property: library.preload=%s", preloadPath.c_str());
+    // Decision: here it is used as a path, so backslashes are separators; above it was handed on.
     std::wstring library = preloadPath;
     convertToOsSeparator(library);
     if (exists(library.c_str()))

@@ -63,6 +63,7 @@ static void appendInstallID(const std::wstring& path, const wchar_t* id)
     }
     // Deliberate: nothing is written before it. Behind a last line without a line end it becomes a
     // part of that line, and the next start makes up another id.
+    // Decision: what the system does not take is not written, though it fits the stream's buffer.
     if (!putWide(file, std::wstring(L"rcp.install.id=") + id + L"\n") || fflush(file) != 0)
         fatalErrorA("QVMRL0018E: Error while writing to %ls file.", path.c_str(), EXIT_PROCESS,
                     WITH_ERRNO);

@@ -105,7 +105,7 @@ void writeStartupArgs(int argc, wchar_t** argv, const std::wstring& configDir,
     getEnv(L"LD_LIBRARY_PATH", libraryPath);
     record.write(L"com.vantor.rcp.core.internal.librarypath", libraryPath,
                  "QVMRL0117E: Error writing to %ls file.");
-    // What is still in the stream's buffer counts as the last entry.
+    // Decision: what is still in the stream's buffer counts as the last entry.
     if (fflush(record.file) != 0)
         fatalErrorA("QVMRL0117E: Error writing to %ls file.", record.path.c_str(), EXIT_PROCESS,
                     WITH_ERRNO);

@@ -77,7 +77,9 @@ static pid_t spawnChild(char** args)
 {
     if (args[0] == nullptr)
         return -1;
-    alignas(16) char stack[8192];
+    // Room also for what a preloaded library puts in front of execv: below this array lie the
+    // frames of this very call.
+    alignas(16) char stack[32768];
     Execution execution = {args, false};
     const pid_t child =
         clone(execute, stack + sizeof stack, CLONE_VM | CLONE_VFORK | SIGCHLD, &execution);

@@ -72,7 +72,7 @@ bool isPlatformAlive(long pid, const std::wstring& exeName)
     // A number that no process can have is a dead one, also where pid_t is narrower than long. A
     // negative number is looked up like any other: ps takes it for a session.
     // Decision: 0 and an empty name are a no without a shell, which could only print an error, on
-    // this process's own standard output.
+    // this process's own standard output or standard error.
     std::string name;
     if (pid == 0 || pid > INT_MAX || pid < -INT_MAX || wstrtocs(name, exeName) <= 0)
         return false;
@@ -82,7 +82,7 @@ bool isPlatformAlive(long pid, const std::wstring& exeName)
     int status = 0;
     if (!runShell(test, status)) {
         // Decision: where there is no shell for want of memory or processes, there may be one a
-        // second later. Without one no platform could be started either.
+        // second later. Without processes no platform could be started either.
         sysSleep(1);
         runShell(test, status);
     }

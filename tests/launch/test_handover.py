@@ -1,8 +1,10 @@
 """The last act: the platform becomes a child, the lock is handed over, and sometimes the launcher waits."""
 
 import os
+import pathlib
 import re
 import signal
+import subprocess
 
 import pytest
 
@@ -14,6 +16,28 @@ RELEASED = "QVMRL0306I: lock file released @ <time>\n"
 END = "QVMRL0133I: ===== End Launch Parameters =====\n"
 DELAYED_EXEC = ["-e", "trace=execve", "-e", "inject=execve:delay_enter=700000"]
 NO_FORK = ["-e", "trace=clone,clone3,fork,vfork", "-e", "inject=clone,clone3,fork,vfork:error=EAGAIN"]
+
+
+@pytest.fixture
+def in_front_of_exec(world, tmp_path_factory):
+    """A library that does something of its own before each exec."""
+    made = tmp_path_factory.mktemp("library") / "exec_preload.so"
+    width = "-m32" if world._launcher[4] == 1 else "-m64"
+    subprocess.run([os.environ.get("CC", "cc"), width, "-O1", "-shared", "-fPIC",
+                    str(pathlib.Path(__file__).parent / "exec_preload.c"), "-o", str(made), "-ldl"], check=True)
+    return made.read_bytes()
+
+
+def test_a_library_in_front_of_the_exec_has_room(world, in_front_of_exec):
+    """As an administrator preloads one that keeps a record of what is executed."""
+    if world.sanitized:
+        pytest.skip("the sanitizer's own library must come first")
+    world.install()
+    world.write("/mnt/exec_preload.so", in_front_of_exec)
+    assert world.run(env={"LD_PRELOAD": "/mnt/exec_preload.so"}).status == 0
+    platform = world.only_platform()
+    assert platform.argv == MAIN_ARGV
+    assert read(LOCK) == "%d          " % platform.pid
 
 
 def forked(world):
