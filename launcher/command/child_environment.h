@@ -27,7 +27,8 @@ void addEnvJavaHighZipfds(const PropertyList& props);
 /// the link "/tmp/vantor.rcp.<user>.<install id>.<library name>", which is made, or replaced when
 /// it leads elsewhere; a library with a blank that does not exist sets nothing, one without is not
 /// looked at. A link that cannot be made or replaced is named all the same. Traces every step.
-/// Fatal: QVMRL0189E (no "/" in the path), "QVMRL0006E: Couldn't find the user name!", QVMRL0184E.
+/// Fatal: QVMRL0189E (neither "/" nor "\" in the path), "QVMRL0006E: Couldn't find the user name!",
+/// QVMRL0184E.
 void setPreload(const std::wstring& preloadPath, const std::wstring& installId);
 
 #endif

@@ -56,7 +56,7 @@ def test_placeholders_are_not_resolved_in_the_default(world):
     ("/mnt/${env.USER}/${env.NONE,x}", "/mnt/anna/x"),
     ("/mnt/${prop.rcp.install.id}", "/mnt/abc"),
     ("/mnt/w/../v", "/mnt/w/../v"),
-    ("/mnt/w/.", "/mnt/w/."),  # which stands once /mnt/w is made
+    ("/mnt/new/.", "/mnt/new/."),  # which stands once /mnt/new is made
 ])
 def test_the_workspace_of_the_command_line(world, word, workspace):
     """One separator at the end is dropped, placeholders are resolved; the path is not folded otherwise."""

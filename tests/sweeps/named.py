@@ -41,14 +41,19 @@ NAMED = (
           "A log that cannot be opened or written takes no line.",
           "The status alone tells that the start has failed.",
           "silent", ("lasting",), calls=("write",)),
-    Named("no-log",  # while it is open, a fatal end has its line
-          "", "", "silent", ("lasting",), calls=OPENING, path=r"(?!\.config/|applications/|logs/shutdown).*"),
+    Named("no-log",  # what is opened before it, or is it; while it is open, a fatal end has its line
+          "", "", "silent", ("lasting",), calls=OPENING,
+          path=r"\.rcp\.lock|\.sid|logs/velmora\.log|/(etc|usr)/.*|/mnt/app/rcp/(velmora\.properties|prov\.debug/debug\.txt)"),
     Named("platform-not-seen",
           "A lock file of which the system says that it is not there holds no platform, and a process test that fails is "
           "a no.",
           "A second platform starts in the workspace while the first one runs. It takes a file system that denies a file "
           "that is there, or a shell that cannot do its work, at that very moment.",
-          "two-platforms", ("errors", "lasting"), ("daemon",), path=r"\.rcp\.lock|"),
+          "two-platforms", ("errors", "lasting"), ("daemon",), calls=("access",), path=r"\.rcp\.lock",
+          when=lambda case: case["what"] == "ENOENT"),
+    Named("platform-not-seen",
+          "", "", "two-platforms", ("errors", "lasting"), ("daemon",),
+          calls=("mmap", "mmap2", "clone", "clone3", "vfork"), path=""),
     Named("number-not-recorded",
           "When the platform's number cannot be written into the lock file, not at the second try either, that is logged "
           "(QVMRL0051E), and the start goes on.",
@@ -79,7 +84,8 @@ NAMED = (
           when=lambda case: case["call"] == "read" or _logged("QVMRL0001E", "QVMRL0015E")(case)),
     Named("user-properties-short",
           "", "", r"next-start:255 QVMRL0011E|missing:\.rcp\.main|short:\.config/rcpinstall\.properties", ("lasting",),
-          calls=("read", "write"), path=r"\.config/rcpinstall\.properties\.(part|new)"),
+          calls=("read", "write"), path=r"\.config/rcpinstall\.properties\.(part|new)",
+          when=lambda case: (case["call"] == "read") == case["path"].endswith(".part")),
     Named("user-properties-copy-left",
           "The results of the removal and the renaming at the end are not looked at.",
           "The plain copy stays beside the user's rcpinstall.properties. Nothing reads it.",
