@@ -14,7 +14,7 @@ from world import (APP, ECLIPSE, HEAD, INSTALL_AREA, JAVA, LAUNCHER, LOCK, MAIN,
 MAIN_ARGV = HEAD + areas() + STARTUP + system() + INSTALL_AREA
 RELEASED = "QVMRL0306I: lock file released @ <time>\n"
 END = "QVMRL0133I: ===== End Launch Parameters =====\n"
-DELAYED_EXEC = ["-e", "trace=execve", "-e", "inject=execve:delay_enter=700000"]
+DELAYED_EXEC = ["-e", "trace=execve", "-e", "inject=execve:delay_enter=2000000"]
 NO_FORK = ["-e", "trace=clone,clone3,fork,vfork", "-e", "inject=clone,clone3,fork,vfork:error=EAGAIN"]
 
 

@@ -219,7 +219,7 @@ def test_an_installation_that_is_taken_away_meanwhile(world):
     """The folder of the running executable is gone before the launcher asks for it."""
     world.install()
     start = world.start(strace=["-e", "trace=readlink,readlinkat", "-e",
-                                "inject=readlink,readlinkat:delay_enter=500000"])
+                                "inject=readlink,readlinkat:delay_enter=1500000"])
     until(lambda: os.readlink("/proc/%d/exe" % start.pid) == LAUNCHER, "the launcher runs")
     for name in os.listdir(APP + "/rcp"):
         os.unlink(APP + "/rcp/" + name)

@@ -12,7 +12,7 @@ from scenarios import SCENARIOS, mains, prepare
 from world import LAUNCHER, LOCK, LOG, WORKSPACE, executable, read, read_bytes, until
 
 # Whoever executes a program waits a little before; the tracer is no child of the test.
-SLOW_EXEC = ["-D", "-f", "-e", "trace=execve", "-e", "inject=execve:delay_enter=400000"]
+SLOW_EXEC = ["-D", "-f", "-e", "trace=execve", "-e", "inject=execve:delay_enter=1500000"]
 
 
 def _killed_with_a_child(pieces, name, strace):
@@ -51,7 +51,7 @@ def _workspace_made_meanwhile(pieces):
     calls = [call for call in sweeps.list_calls_of(lab, scenario) if call.name == "mkdir"]
     last = [call for call in calls if call.path() == WORKSPACE][-1]
     lab.reset()
-    delay = "inject=mkdir:delay_enter=1000000:when=%d" % last.number
+    delay = "inject=mkdir:delay_enter=2000000:when=%d" % last.number
     start = lab.start(strace=["-e", "trace=mkdir", "-e", delay])
     until(lambda: os.path.isdir(os.path.dirname(WORKSPACE)), "it makes the folders above")
     os.mkdir(WORKSPACE)
@@ -73,7 +73,7 @@ def _log_shared(pieces):
     prepare(lab, scenario)
     last = [call for call in sweeps.list_calls_of(lab, scenario) if call.name == "write" and call.path() == LOG][-1]
     lab.reset()
-    delay = "inject=write:delay_enter=700000:when=%d" % last.number
+    delay = "inject=write:delay_enter=2000000:when=%d" % last.number
     first = lab.start(strace=["-e", "trace=write", "-e", delay])
     platform = until(lab.records, "the platform runs")[0]
     until(lambda: read(LOCK).startswith("%d " % platform.pid), "it is recorded")
