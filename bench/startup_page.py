@@ -38,8 +38,8 @@ def label(result, name):
     """The title, with the width of an executable that comes in two."""
     for build, width in WIDTHS.items():
         if build in name.split("-"):
-            start = "velmora, " if name.startswith(build) else ""
-            return "%s%s, %s" % (start, result["starts"][name]["title"], width)
+            whose = {build: "velmora, ", "static": "velmora with a static C library, "}.get(name.partition("-")[0], "")
+            return "%s%s, %s" % (whose, result["starts"][name]["title"], width)
     return result["starts"][name]["title"]
 
 

@@ -12,18 +12,20 @@ HERE = pathlib.Path(__file__).resolve().parent
 ROOT = HERE.parent
 STRICT = ["-std=c11", "-O2", "-Wall", "-Wextra", "-Wshadow", "-Werror"]
 BARE = ["-ffreestanding", "-fno-stack-protector", "-nostdlib"]
+SHARED = ["-fPIE", "-pie", "-Wl,-z,relro,-z,now"]  # linked as velmora is
 # Each with its source and what the compiler is told besides.
 COMPILED = {
     "stopwatch": ("stopwatch.c", ["-static"]),
     "child": ("child.c", ["-static", *BARE]),
     "libjli.so": ("jli.c", ["-shared", "-fPIC", *BARE]),
     "limit": ("limit.c", ["-static"]),
-    "floor-native": ("floor.c", []),
-    "floor-i686": ("floor.c", ["-m32"]),
-    "least-native": ("least.c", []),
-    "least-i686": ("least.c", ["-m32"]),
+    "floor-native": ("floor.c", SHARED),
+    "floor-i686": ("floor.c", [*SHARED, "-m32"]),
+    "least-native": ("least.c", SHARED),
+    "least-i686": ("least.c", [*SHARED, "-m32"]),
     "flush.so": ("flush.c", ["-shared", "-fPIC"]),
 }
+WIDTHS = {"native": [], "i686": ["-m32"]}
 MANIFEST = "Manifest-Version: 1.0\nMain-Class: bench.Platform\n"
 
 
@@ -42,6 +44,26 @@ def build_launchers(builds):
                                   text=True, check=False)
             if done.returncode != 0:
                 sys.exit(done.stdout + "error: %s could not be built" % build)
+
+
+def static_launchers(launchers):
+    """The bytes of each launcher with the C library inside, as "static-" and its build, made of the objects that lie
+    beside it; none when they do not."""
+    found = {}
+    for build, launcher in launchers.items():
+        objects = [pathlib.Path(launcher).parent / name
+                   for name in ("CMakeFiles/velmora.dir/launcher/main.cpp.o", "libvelmora_launcher.a")]
+        if not all(path.is_file() for path in objects):
+            continue
+        with tempfile.TemporaryDirectory() as folder:
+            # The linker warns of what such a launcher could not do: that is why there is none.
+            done = subprocess.run([os.environ.get("CXX", "c++"), *WIDTHS[build], "-static", "-Wl,--gc-sections",
+                                   "-o", folder + "/velmora", *objects],
+                                  stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True, check=False)
+            if done.returncode != 0:
+                sys.exit(done.stdout + "error: %s could not be linked with a static C library" % build)
+            found["static-" + build] = pathlib.Path(folder, "velmora").read_bytes()
+    return found
 
 
 def tree(folder):

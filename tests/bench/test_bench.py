@@ -17,6 +17,7 @@ BENCH = ROOT / "bench"
 LAUNCHERS = {build: ROOT / "build" / build / "velmora" for build in ("native", "i686")}
 SCENARIOS = ["first", "warm", "daily", "beside", "fatal"]
 VELMORA = [build + "-" + scenario for build in LAUNCHERS for scenario in SCENARIOS]
+STATIC = ["static-%s-%s" % (build, scenario) for build in LAUNCHERS for scenario in ("first", "warm")]
 OTHERS = ["limit", "limit-ps", "floor-native", "floor-i686", "least-native-first", "least-i686-first",
           "least-native-warm", "least-i686-warm", "least-native-beside", "least-i686-beside", "dash", "jpackage"]
 
@@ -57,7 +58,7 @@ def report():
 
 
 def test_everything_is_started_in_every_round(result):
-    assert sorted(result["starts"]) == sorted(VELMORA + OTHERS)
+    assert sorted(result["starts"]) == sorted(VELMORA + STATIC + OTHERS)
     assert sorted(result["disk"]) == ["disk-disk", "disk-flushed", "disk-memory"]
     for name, start in {**result["starts"], **result["disk"]}.items():
         for key in ("to_child", "to_exit", "cpu", "resident", "faults"):
@@ -79,7 +80,8 @@ def test_helpers_and_libraries_are_known(result):
     for name in VELMORA:
         assert result["counts"][name]["helpers"] == (3 if name.endswith("-beside") else 0), name
         assert [path.rpartition("/")[2] for path in result["counts"][name]["libraries"]] == ["libc.so.6"], name
-    assert result["counts"]["limit"]["libraries"] == []
+    for name in ["limit", *STATIC]:
+        assert result["counts"][name]["libraries"] == [], name
     assert [result["counts"][name]["helpers"] for name in ("limit", "limit-ps")] == [0, 3]
 
 
@@ -87,7 +89,7 @@ def test_what_the_tables_need_is_kept(result):
     text = startup_page.tables(result)
     for name in result["starts"]:
         assert startup_page.label(result, name) in text
-    assert startup_page.chart(result).count("<rect") == 1 + len(VELMORA) - 2 + len(OTHERS)
+    assert startup_page.chart(result).count("<rect") == 1 + len(VELMORA) - 2 + len(STATIC + OTHERS)
 
 
 def test_a_target_is_judged_by_its_figures(result):
