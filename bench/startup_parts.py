@@ -12,7 +12,8 @@ HERE = pathlib.Path(__file__).resolve().parent
 ROOT = HERE.parent
 STRICT = ["-std=c11", "-O2", "-Wall", "-Wextra", "-Wshadow", "-Werror"]
 BARE = ["-ffreestanding", "-fno-stack-protector", "-nostdlib"]
-SHARED = ["-fPIE", "-pie", "-Wl,-z,relro,-z,now"]  # linked as velmora is
+HARDENED = ["-Wl,-z,relro,-z,now"]
+SHARED = ["-fPIE", "-pie", *HARDENED]  # linked as velmora is
 # Each with its source and what the compiler is told besides.
 COMPILED = {
     "stopwatch": ("stopwatch.c", ["-static"]),
@@ -57,8 +58,8 @@ def static_launchers(launchers):
             continue
         with tempfile.TemporaryDirectory() as folder:
             # The linker warns of what such a launcher could not do: that is why there is none.
-            done = subprocess.run([os.environ.get("CXX", "c++"), *WIDTHS[build], "-static", "-Wl,--gc-sections",
-                                   "-o", folder + "/velmora", *objects],
+            done = subprocess.run([os.environ.get("CXX", "c++"), *WIDTHS[build], "-static-pie", *HARDENED,
+                                   "-Wl,--gc-sections", "-o", folder + "/velmora", *objects],
                                   stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True, check=False)
             if done.returncode != 0:
                 sys.exit(done.stdout + "error: %s could not be linked with a static C library" % build)
