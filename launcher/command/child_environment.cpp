@@ -91,6 +91,8 @@ static std::wstring preloadLinkPath(const std::wstring& libraryName, const std::
     std::wstring user;
     if (!getEnv(L"USER", user))
         fatalErrorA("QVMRL0006E: Couldn't find the user name!", EXIT_PROCESS, WITH_ERRNO);
+    // Decision: its backslashes stay: with separators instead of them it would be nowhere, for a
+    // user whose name brings its domain along.
     return L"/tmp/vantor.rcp." + user + L"." + installId + L"." + libraryName;
 }
 

@@ -1,10 +1,13 @@
 """The environment that the platform inherits: the launcher's own, changed by the user's properties."""
 
+import datetime
 import os
+import re
+import subprocess
 
 import pytest
 
-from world import CONFIG, ECLIPSE, HOME, JAVA, WORKSPACE, read, tree, user_logs
+from world import CONFIG, ECLIPSE, HOME, JAVA, LOG, WORKSPACE, read, tree, user_logs
 
 INHERITED = {"HOME": HOME, "USER": "anna", "LC_ALL": "C.UTF-8", "PATH": "/usr/bin:/bin"}
 LIBRARY = "/mnt/my lib/libx.so"
@@ -205,6 +208,28 @@ def test_a_daemon_process_gives_its_platform_the_same(world):
     assert first.env == second.env == environment(LD_LIBRARY_PATH="/main:/b", A="1")
 
 
+def hours_of_the_system():
+    """What the system's own time zone is ahead of UTC."""
+    words = ["/usr/bin/env", "-u", "TZ", "/usr/bin/date", "+%z"]
+    sign, hours, minutes = re.fullmatch(r"([+-])(\d\d)(\d\d)\n", subprocess.run(
+        words, stdout=subprocess.PIPE, text=True, check=True).stdout).groups()
+    return int(sign + "1") * (int(hours) + int(minutes) / 60)
+
+
+@pytest.mark.parametrize("line, inherited, before, after", [
+    ("env.set.TZ=XXX-11", "AAA0", 0, 11),
+    ("env.set.TZ=XXX-11", None, None, 11),
+    ("env.unset.TZ=", "XXX+11", -11, None),
+])
+def test_a_time_zone_is_that_of_the_log_from_then_on(world, line, inherited, before, after):
+    """The lock is had before the platform's environment is made, and released after it."""
+    started(world, line, env={"TZ": inherited} if inherited else {})
+    for hours, text in ((before, "QVMRL0303I: lock file captured"), (after, "QVMRL0306I: lock file released")):
+        stamp = re.search(text + r" @ (\d{8}_\d{6})_\d{3}\n", read(LOG)).group(1)
+        here = datetime.datetime.utcnow() + datetime.timedelta(hours=hours_of_the_system() if hours is None else hours)
+        assert abs(datetime.datetime.strptime(stamp, "%Y%m%d_%H%M%S") - here) < datetime.timedelta(minutes=10), text
+
+
 # ---- the library to preload
 
 def test_a_library_without_a_blank_is_named_directly(world):
@@ -226,6 +251,16 @@ def test_the_link_is_named_for_whoever_starts(world):
     assert started(world, "library.preload=" + LIBRARY, env={"USER": "alice"}) == environment(
         USER="alice", LD_PRELOAD="/tmp/vantor.rcp.alice.abc.libx.so")
     assert tree("/tmp") == ["vantor.rcp.alice.abc.libx.so -> /mnt/my lib/libx.so"]
+
+
+def test_the_link_of_a_user_with_a_domain(world):
+    """The backslash is a part of its name; in the workspace it is a separator."""
+    world.write(LIBRARY)
+    link = "/tmp/vantor.rcp.DOM\\anna.abc.libx.so"
+    assert started(world, "library.preload=" + LIBRARY, env={"USER": "DOM\\anna"}) == environment(
+        USER="DOM\\anna", LD_PRELOAD=link)
+    assert tree("/tmp") == ["vantor.rcp.DOM\\anna.abc.libx.so -> /mnt/my lib/libx.so"]
+    assert os.path.exists(HOME + "/VANTOR/RCP/abc/DOM/anna/.config/config.ini")
 
 
 def test_a_blank_in_the_librarys_own_name(world):

@@ -106,6 +106,29 @@ def test_jvm_words_are_dropped_and_named_ones_stay(world):
         "-debug2", *WORDS, jvm=["-A", "-B"])
 
 
+def test_named_jvm_words_of_the_group_come_after_those_of_the_files(world):
+    """Those of an ordinary extension would come before."""
+    world.install("user", *GROUP, "config.initial.5=vmarg.a=-of-group", "config.initial.6=vmarg.c=-C")
+    world.base_properties("vmarg.a=-A")
+    world.jvm_properties("vmarg.b=-B")
+    world.run()
+    assert world.only_platform().argv == command(*WORDS, jvm=["-A", "-B", "-C"])
+
+
+def test_the_vm_of_the_group_is_the_commands_alone(world):
+    """The JVM's file was looked for where the first words said."""
+    world.install("user", "jvm.location=/mnt/o/jvm/bin/java", *GROUP, "config.initial.5=-vm",
+                  "config.initial.6=/mnt/g/jvm/bin/qvw")
+    world.write("/mnt/g/jvm/bin/qv")
+    for name in ("l", "o", "g"):
+        world.jvm_properties("-Dof=" + name, "-Dhome=${prop.java.home}", root="/mnt/%s/jvm/" % name)
+    world.run("-vm", "/mnt/l/jvm/bin/java", "-console")
+    expected = command("-console", *WORDS, more=["-vm", "/mnt/g/jvm/bin/qv"])
+    at = expected.index(*INSTALL_AREA)
+    assert world.only_platform().argv == expected[:at] + ["-Dof=l", "-Dhome=/mnt/l"] + expected[at:]
+    assert 'QVMRL0021I: VM specified is "/mnt/l/jvm/bin/java"\n' in world.log()
+
+
 def test_another_extension_is_dropped(world):
     """Its words are gone, its named JVM arguments were taken before."""
     assert started(world, "-config", "a", group=[

@@ -49,6 +49,14 @@ def test_no_file_and_still_a_root(world):
     assert shown(world) == ["-Droot=/mnt/app/rcp/deploy/"]
 
 
+def test_no_file_and_the_library_path_stays_as_it_is(world):
+    """It is only fixed up for a JVM whose file was read."""
+    world.install()
+    world.base_properties("jvm.library.path=lib", "-Dpath=${prop.jvm.library.path}")
+    world.run()
+    assert shown(world) == ["-Dpath=lib"]
+
+
 def test_a_file_that_cannot_be_read_counts_as_absent(world):
     world.install()
     world.jvm_properties("-Dx=1")
@@ -170,6 +178,16 @@ def test_a_home_that_is_given_is_kept(world):
     world.jvm_properties(*SHOWN, "java.home=/mnt/mine")
     world.run()
     assert shown(world) == ["-Dhome=/mnt/mine", "-Droot=/mnt/app/rcp/deploy/"]
+
+
+@pytest.mark.parametrize("users", [True, False])
+def test_a_home_that_is_given_and_empty_is_kept(world, users):
+    """In the user's file as in that of the JVM."""
+    world.install("user", "jvm.location=/mnt/o/jvm/bin/java")
+    world.base_properties(*(["java.home="] if users else []))
+    world.jvm_properties(*SHOWN, *([] if users else ["java.home="]))
+    world.run()
+    assert shown(world) == ["-Dhome=", "-Droot=/mnt/app/rcp/deploy/"]
 
 
 def test_a_home_that_is_given_is_not_even_computed(world):

@@ -50,6 +50,45 @@ def test_a_reset(world):
     assert world.platforms()[1].argv == command("-foo")
 
 
+def test_a_daemon_process_resets_too(world):
+    """While the main platform runs; what only the main process makes is missing from the new configuration."""
+    area(world, "resetDir.a=org.example")
+    world.plan("wait", start=1)
+    world.run()
+    main = world.platform(1)
+    old = contents(CONFIG)
+    reset(world, "-foo")
+    expected = renewed(old, base=["resetDir.a=org.example"], state={})
+    del expected[".config/args.properties"]
+    assert workspace() == expected
+    argv = command("-foo")
+    at = argv.index("-startup")
+    assert world.platform(2).argv == argv[:at] + ["-useDaemon", str(main.pid)] + argv[at:]
+    assert main.alive()
+
+
+def test_the_reset_of_a_service(world):
+    """Its configuration lies beside its workspace, and so does the backup; registry, bookmarks and the plug-in state
+    are the workspace's. The word for another workspace has no effect."""
+    world.install("service", "jvm.location=/mnt/jvm/bin/java")
+    world.base_properties("resetDir.a=org.example")
+    world.stand_in("/mnt/jvm/bin/java")
+    top = "/mnt/app/eclipse"
+    world.folder(top, 0o777)
+    assert world.run().status == 0
+    world.write(top + "/.config/mine.prefs", "mine\n")
+    world.write(top + "/.config/org.eclipse.update/registry", REGISTRY)
+    world.write(top + "/.workspace/.metadata/.plugins/org.example/state", "state\n")
+    old = contents(top + "/.config")
+    assert world.run("-resetconfig", "-data", "/mnt/other").status == 0
+    assert contents(top + "/.configbak") == old
+    new = contents(top + "/.config")
+    assert new["org.eclipse.update/registry"] == REGISTRY and "mine.prefs" not in new
+    assert contents(top + "/.workspace/.metadata") == {".plugins/": None}
+    assert sorted(os.listdir(top)) == [".config", ".configbak", ".workspace"]
+    assert not os.path.exists("/mnt/other")
+
+
 def test_a_start_without_the_word_resets_nothing(world):
     old = area(world, "resetDir.a=org.example")
     world.run("-Resetconfig")

@@ -1,11 +1,15 @@
 """One main process for each workspace: the lock file, the pid file, and when a start becomes a daemon process."""
 
+import datetime
+import fcntl
 import os
+import re
+import time
 
 import pytest
 
-from world import (BASE, CONFIG, ECLIPSE, HEAD, INSTALL_AREA, LOCK, MAIN, STARTUP, TEMP_LOG, WORKSPACE, areas,
-                   lines, read, read_bytes, system, temp_logs, untimed)
+from world import (BASE, CONFIG, ECLIPSE, HEAD, INSTALL_AREA, LOCK, LOG, MAIN, STARTUP, TEMP_LOG, WORKSPACE, areas,
+                   lines, read, read_bytes, state, system, temp_logs, until, untimed)
 
 BAD_LOCK = "QVMRL0092E: Error reading platform lock file."
 MAIN_LINE = "QVMRL0304I: We are main process\n"
@@ -125,6 +129,21 @@ def test_longer_content_stays_behind_the_ten_blanks(world):
     world.run()
     number = "%d          " % world.only_platform().pid
     assert read(LOCK) == number + "99999abcdefghijklmnopq"[len(number):]
+
+
+def test_the_time_of_the_lock_is_when_it_was_had(world):
+    """Not when the start began to wait for it."""
+    world.install()
+    world.write(LOCK, "")
+    with open(LOCK, "r+b") as held:
+        fcntl.flock(held, fcntl.LOCK_EX)
+        start = world.start()
+        until(lambda: state(start.pid) == "S", "the launcher waits")
+        time.sleep(0.5)
+        released = datetime.datetime.now()
+    assert start.wait().status == 0
+    told = re.search(r"^QVMRL0303I: lock file captured @ (\d{8}_\d{6}_\d{3})$", read(LOG), re.M).group(1)
+    assert datetime.datetime.strptime(told + "999", "%Y%m%d_%H%M%S_%f") >= released
 
 
 @pytest.mark.parametrize("content", ["junk", "x1", "- 99999", ".", "\n\nx", "\0", "#1"])

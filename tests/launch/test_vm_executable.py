@@ -62,6 +62,16 @@ def test_with_a_console_the_console_variant_is_named(world, windowed, console, w
     assert vm_words(world) == ["-vm", "/mnt/jvm/bin/" + console]
 
 
+def test_a_restart_with_a_console_takes_the_console_variant_too(world):
+    """Though the word itself is left out of its command, and the fix for a JVM without a console is in it."""
+    world.install("user", "jvm.location=/mnt/jvm/bin/javaw")
+    world.base_properties("vmfix.noconsole=-Dfix")
+    world.write("/mnt/jvm/bin/java")
+    world.run("-restart", "-console")
+    assert world.only_platform().argv == (
+        HEAD + areas() + ["-vm", "/mnt/jvm/bin/java"] + STARTUP + ["-Dfix"] + system() + INSTALL_AREA)
+
+
 @pytest.mark.parametrize("windowed, console", PAIRS)
 def test_a_console_variant_that_is_missing(world, windowed, console):
     """The message names the variant, not what was asked for."""
@@ -69,6 +79,14 @@ def test_a_console_variant_that_is_missing(world, windowed, console):
     world.write("/mnt/jvm/bin/" + windowed)
     world.fatal(world.run("-console"), "QVMRL0003E: Specified vm (/mnt/jvm/bin/%s) does not exist!" % console,
                 "No such file or directory")
+
+
+def test_a_console_variant_that_cannot_be_read_counts_as_missing(world):
+    """Though it could be executed."""
+    world.install("user", "jvm.location=/mnt/jvm/bin/javaw")
+    world.write("/mnt/jvm/bin/java", mode=0o111)
+    world.fatal(world.run("-console"), "QVMRL0003E: Specified vm (/mnt/jvm/bin/java) does not exist!",
+                "Permission denied")
 
 
 def test_without_a_console_the_windowed_variant_stays(world):
