@@ -99,7 +99,19 @@ def test_data_after_vmargs_counts(world):
 
 def test_backslashes_are_separators_for_files_but_stay_in_the_words(world):
     world.install()
+    world.write(APP + "/shared/eclipse/.eclipseextension", "shared\n")
     works_in(world, "/mnt\\w\\x", "-data", "/mnt\\w\\x", folder="/mnt/w/x")
+    for name in ("/.config/org.eclipse.update/platform.xml", "/.config/rcpinstall.properties", "/logs/shutdown.log",
+                 "/applications/eclipse/.eclipseextension", "/.rcp.main"):
+        assert os.path.isfile("/mnt/w/x" + name)
+    assert os.listdir("/mnt/w") == ["x"]
+
+
+def test_what_is_recorded_below_a_path_with_backslashes_is_read_back(world):
+    world.install()
+    world.base_properties("-Darg=${prop.arg0}")
+    world.run("-data", "/mnt\\w")
+    assert "-Darg=" + LAUNCHER in world.only_platform().argv
 
 
 def test_a_second_rcp_home_is_no_placeholder_for_the_workspace(world):

@@ -133,6 +133,27 @@ def test_vmargs_as_the_value_of_such_an_option(world):
         HEAD + ["-product", "-vmargs"] + areas() + STARTUP + ["-Xa"] + system() + INSTALL_AREA)
 
 
+def test_only_the_first_of_such_an_option_passes_the_next_word_on(world):
+    """The word after a repeat is what it always is."""
+    world.install()
+    world.run("-product", "a", "-product", "-data", "/mnt/w", "-x")
+    world.run("-personality", "a", "-personality", "-vmargs", "-Xa", "-data", "/mnt/v")
+    assert [platform.argv for platform in world.platforms()] == [
+        HEAD + ["-product", "a", "-product", "-x"] + areas("/mnt/w") + STARTUP + system("/mnt/w") + INSTALL_AREA,
+        HEAD + ["-personality", "a", "-personality"] + areas("/mnt/v") + STARTUP + ["-Xa", "-data", "/mnt/v"]
+        + system("/mnt/v") + INSTALL_AREA]
+
+
+def test_what_the_installation_names_is_passed_on_as_it_stands(world):
+    """Placeholders are resolved in the user's properties alone."""
+    world.install("user", "product=${rcp.home}/p", "osgi.splashPath=${rcp.home}/s")
+    world.base_properties("application=${rcp.home}/a")
+    world.run()
+    assert world.only_platform().argv == (
+        HEAD + areas() + ["-application", "/mnt/app/a", "-product", "${rcp.home}/p"] + STARTUP + system()[:2]
+        + ["-Dosgi.splashPath=${rcp.home}/s"] + system()[2:] + INSTALL_AREA)
+
+
 def test_in_debug_mode_errors_are_not_suppressed(world):
     """The word itself is the platform's too."""
     world.install()

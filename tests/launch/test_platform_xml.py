@@ -98,6 +98,28 @@ def test_an_id_may_bring_in_the_version_and_the_parent(world):
     assert made(world, "${jvm.feature.id}\n", *properties) == "a-1-p\n"
 
 
+def test_what_a_later_value_brings_in_stays(world):
+    """Each kind is replaced once: the id, then its version, then the parent's."""
+    properties = ["jvm.feature.id=a", "jvm.feature.version=<${jvm.feature.id}>",
+                  "jvm.parent.feature.id=${jvm.feature.id}", "jvm.parent.feature.version=${jvm.parent.feature.id}"]
+    assert made(world, "${jvm.feature.id} ${jvm.feature.version}\n"
+                       "${jvm.parent.feature.id} ${jvm.parent.feature.version}\n", *properties) == (
+        "a <${jvm.feature.id}>\n${jvm.feature.id} ${jvm.parent.feature.id}\n")
+
+
+@pytest.mark.parametrize("managed", [True, False])
+def test_what_makes_no_file_makes_no_first_start(world, managed):
+    """The second start would provision otherwise, and so would every one after it."""
+    level = "provisioning.manifest.version=2"
+    install(world, "", "provisioning=true", "provisioning.application=org.prov", level,
+            *([] if managed else ["update.policy.managed=false"]))
+    world.base_properties(level)
+    os.unlink(TEMPLATE)
+    assert [world.run("-velmoraWait").status for _ in range(2)] == [0, 0]
+    assert ["org.prov" in platform.argv for platform in world.platforms()] == [True, False]
+    assert tree(UPDATE) == []
+
+
 def test_empty_values_are_values(world):
     assert made(world, "<${jvm.feature.id},${jvm.feature.version}>\n", "jvm.feature.id=", "jvm.feature.version=") == (
         "<,>\n")

@@ -6,7 +6,7 @@ import shutil
 
 import pytest
 
-from world import (CONFIG, ECLIPSE, HEAD, INSTALL_AREA, JAVA, LOCK, LOG, MAIN, STARTUP, TEMP_LOG, USER_PROPERTIES,
+from world import (CONFIG, ECLIPSE, HEAD, INSTALL_AREA, JAVA, LOCK, LOG, MAIN, PROPERTIES, STARTUP, TEMP_LOG, USER_PROPERTIES,
                    WORKSPACE, areas, lines, read, system, tree, until, user_logs)
 
 LEVEL = "provisioning.manifest.version="
@@ -127,6 +127,20 @@ def test_every_group_of_a_provisioning_command(world):
         "-Drcp.home=/mnt/app", "-Drcp.data=" + WORKSPACE, "-Dosgi.splashPath=file:/s",
         "-Dcom.vantor.rcp.install.id=abc", "-Drcp.install.config=user", "-Dfoo=bar",
         "-Drcp.osgi.install.area=/mnt/app/rcp/eclipse", "-Xmx1g", "-cp", "/cp.jar"]]
+
+
+def test_the_application_is_named_as_it_stands(world):
+    """Placeholders of the installation's own properties are not resolved."""
+    install(world)
+    world.properties(*(line.replace("org.prov", "${rcp.home}") for line in read(PROPERTIES).splitlines()))
+    world.run()
+    assert commands(world) == [[word.replace("org.prov", "${rcp.home}") for word in provisioning()]]
+
+
+def test_a_vm_that_is_a_library_needs_no_fix(world):
+    install(world, "jvm.location=/mnt/x.ee", base=["vmfix.noconsole=-Dfix"])
+    world.run()
+    assert commands(world) == [provisioning(vm=["-vm", "/mnt/x.ee"])]
 
 
 @pytest.mark.parametrize("share, given", [
@@ -305,6 +319,14 @@ def test_a_level_is_compared_as_it_stands_in_the_file(world):
         assert world.run("-velmoraWait", env={"L": "2"}).status == 0
     assert commands(world) == [provisioning("-velmoraWait")] * 2
     assert tree("/mnt/cache") == ["0644 a"]
+
+
+def test_the_level_may_be_the_jvms(world):
+    """Its properties are the user's last ones."""
+    install(world)
+    assert provisions(world)
+    world.jvm_properties(LEVEL + "2")
+    assert not provisions(world)
 
 
 def test_a_level_that_the_installation_lacks(world):

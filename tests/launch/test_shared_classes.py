@@ -4,7 +4,8 @@ import os
 
 import pytest
 
-from world import ECLIPSE, HEAD, INSTALL_AREA, LOCK, STARTUP, areas, lines, read, system, tree
+from world import (BASE, ECLIPSE, HEAD, INSTALL_AREA, LOCK, PROPERTIES, STARTUP, USER_PROPERTIES, WORKSPACE, areas, lines,
+                   read, system, tree)
 
 CACHE = "/mnt/cache"
 ARGV = HEAD + areas() + STARTUP + system() + INSTALL_AREA
@@ -69,6 +70,42 @@ def test_a_level_is_resolved_before_it_is_compared(world, level, left):
     install(world, "provisioning.manifest.version=${env.L}")
     assert world.run(env={"L": level}).status == 0
     assert tree(CACHE) == left
+
+
+def test_the_level_of_the_installation_is_compared_as_it_stands(world):
+    """Though the user's is resolved: the same placeholder on both sides is no equal level."""
+    install(world, "provisioning.manifest.version=${env.L}", level="${env.L}")
+    world.run(env={"L": "2"})
+    assert tree(CACHE) == []
+
+
+def test_level_and_folder_may_be_the_jvms_own_properties(world):
+    world.install("user", "provisioning.manifest.version=2")
+    world.jvm_properties("provisioning.manifest.version=1", "jvm.shareclasses.fullpath=" + CACHE)
+    world.write(CACHE + "/a")
+    world.run()
+    assert tree(CACHE) == []
+
+
+def test_it_is_emptied_after_the_start_was_recorded(world):
+    """So a folder of logs is empty, and a start that cannot be recorded leaves the classes."""
+    world.install("user", "provisioning.manifest.version=2")
+    world.base_properties("jvm.shareclasses.fullpath=${workspace.location}/logs")
+    assert world.run("-velmoraWait").status == 0
+    assert tree(WORKSPACE + "/logs") == []
+    install(world)
+    world.folder(WORKSPACE + "/logs/shutdown.log")
+    os.unlink(USER_PROPERTIES)
+    assert world.run().status == 255
+    assert tree(CACHE) == ["0644 a", "0755 sub/", "0755 sub/sub/", "0644 sub/sub/b"]
+
+
+def test_it_is_emptied_before_the_command_is_made(world):
+    install(world)
+    world.properties(*read(PROPERTIES).splitlines(), "eclipse.name=gone")
+    world.fatal(world.run(), "QVMRL0007E: %s/linux/x86/gone is not executable or does not exist." % BASE,
+                "No such file or directory")
+    assert tree(CACHE) == []
 
 
 def test_a_daemon_process_removes_it_too(world):

@@ -190,6 +190,14 @@ def test_in_a_service_the_chosen_variant_is_the_program(world):
     assert "-vm" not in platform.argv
 
 
+def test_in_a_service_a_library_needs_no_fix(world):
+    world.install("service", "jvm.location=/mnt/jvm/x.ee")
+    world.base_properties("vmfix.noconsole=-Dfix")
+    world.stand_in("/mnt/jvm/x.ee")
+    world.run()
+    assert world.only_platform().argv[:2] == ["/mnt/jvm/x.ee", "-Drcp.home=/mnt/app"]
+
+
 def test_in_a_service_the_vm_of_the_line_is_the_program(world):
     """Its words go nowhere else."""
     world.install("service", "jvm.location=/mnt/jvm/bin/java")
