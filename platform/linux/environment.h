@@ -11,7 +11,7 @@ bool getEnv(const wchar_t* name, std::wstring& out);
 /// The value of HOME, empty when it is unset; returns the characters of `out`.
 const wchar_t* getUserHome(std::wstring& out);
 
-/// Front ends of setenv and unsetenv. True when the call FAILED. Of TZ the log's times know at once.
+/// Front ends of setenv and unsetenv. True when the call FAILED. The log's times follow TZ at once.
 bool setEnv(const wchar_t* name, const wchar_t* value, bool overwrite);
 bool unsetEnv(const wchar_t* name);
 

@@ -19,7 +19,8 @@ SCENARIOS = ["first", "warm", "daily", "beside", "fatal"]
 VELMORA = [build + "-" + scenario for build in LAUNCHERS for scenario in SCENARIOS]
 STATIC = ["static-%s-%s" % (build, scenario) for build in LAUNCHERS for scenario in ("first", "warm")]
 OTHERS = ["limit", "limit-ps", "floor-native", "floor-i686", "least-native-first", "least-i686-first",
-          "least-native-warm", "least-i686-warm", "least-native-beside", "least-i686-beside", "dash", "jpackage"]
+          "least-native-warm", "least-i686-warm", "least-native-beside", "least-i686-beside",
+          "plain-native-warm", "plain-i686-warm", "dash", "jpackage"]
 
 sys.dont_write_bytecode = True
 sys.path[:0] = [str(BENCH), str(ROOT / "tests" / "sweeps")]

@@ -92,6 +92,13 @@ def test_words_that_do_not_make_it_wait(world, words):
     assert world.only_platform().alive()
 
 
+def test_the_launchers_own_name_is_no_word_to_wait(world):
+    world.install()
+    world.plan("wait")
+    assert world.run(argv0="-velmoraWait").status == 0
+    assert world.only_platform().alive()
+
+
 def test_a_platform_that_is_killed_ends_the_wait(world):
     world.install()
     world.plan("wait")

@@ -228,3 +228,13 @@ def test_the_library_path_of_the_jvm(world, given, fixed):
     world.jvm_properties("java.home=/mnt/j", "jvm.library.path=" + given, "-Dpath=${prop.jvm.library.path}")
     world.run()
     assert shown(world) == ["-Dpath=" + fixed]
+
+
+def test_the_library_path_is_put_behind_the_first_text_that_reads_like_its_key(world):
+    """Which may be a value: what stands behind that is a key then, and lost."""
+    world.install()
+    world.base_properties("q=jvm.library.path", "product=P", "jvm.library.path=lib")
+    world.jvm_properties("java.home=/mnt/j", "-Dpath=${prop.jvm.library.path}")
+    world.run()
+    assert shown(world) == ["-Dpath=lib"]
+    assert "-product" not in world.only_platform().argv

@@ -110,6 +110,19 @@ def test_shutdown(world, libraries):
     assert outcome(world, run(world).status) == (0, 1, ["shutdown"], [])
 
 
+def test_the_home_that_the_installation_sets_is_where_the_platform_asks(world, libraries):
+    """What lies in the home of the start is neither read nor removed; the name may hold a blank."""
+    install(world, libraries["true"])
+    world.base_properties("env.set.HOME=/mnt/h 2")
+    world.folder("/mnt/h 2", 0o777)
+    world.write("/mnt/h 2/.exitData", "logoff")
+    world.write(EXIT_DATA, "logoff")
+    world.plan(start=0)
+    world.plan("write", "/mnt/h 2/.exitData", "logoff", start=1)
+    assert outcome(world, run(world).status) == (0, 2, ["logoff"], [])
+    assert read(EXIT_DATA) == "logoff"
+
+
 def test_the_request_for_a_shutdown_byte_for_byte(world, libraries):
     """512 bytes: "shutdown" and its zero, "1" and its zero at 256. All may read and write it, whatever the umask."""
     install(world, libraries["true"])
