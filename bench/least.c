@@ -8,85 +8,22 @@
  *     least APP WORKSPACE PROGRAM beside    the platform runs, which the shell's ps is asked
  */
 #define _GNU_SOURCE
-#include <fcntl.h>
+#include "calls.h"
+
 #include <locale.h>
 #include <signal.h>
-#include <stdio.h>
-#include <stdlib.h>
-#include <string.h>
-#include <sys/file.h>
-#include <sys/stat.h>
 #include <time.h>
-#include <unistd.h>
 
 #define BASE "rcp/eclipse/plugins/base/"
 #define JVM "rcp/eclipse/plugins/velmora.demo.jvm/"
 
-enum { PIECE = 4096 };
-
-static char text[PIECE + 1];
 static wchar_t wide[PIECE + 1];
 
-static const char* below(const char* folder, const char* name)
-{
-    static char path[PIECE];
-    snprintf(path, sizeof path, "%s/%s", folder, name);
-    return path;
-}
-
-static int opened(const char* path, int flags)
-{
-    int fd = open(path, flags | O_CLOEXEC, 0666);
-    if (fd < 0)
-        exit(1);
-    return fd;
-}
-
-/* Reads it to its end, which the last piece does not tell, and has it in wide characters. */
+/* Has all of it in wide characters. */
 static void read_text(const char* path)
 {
-    int fd = opened(path, O_RDONLY);
-    ssize_t length = read(fd, text, PIECE);
-    if (length < 0 || length == PIECE)
-        exit(1);
-    text[length] = 0;
-    if (read(fd, wide, 1) != 0 || mbstowcs(wide, text, PIECE) == (size_t)-1)
-        exit(1);
-    close(fd);
-}
-
-static void put(int fd, const char* words)
-{
-    if (write(fd, words, strlen(words)) != (ssize_t)strlen(words))
-        exit(1);
-}
-
-static void write_text(const char* path, int flags, const char* words)
-{
-    int fd = opened(path, O_WRONLY | O_CREAT | flags);
-    put(fd, words);
-    close(fd);
-}
-
-/* Whether a file is there, which the start does not care about. */
-static void ask(const char* path)
-{
-    int fd = open(path, O_RDONLY | O_CLOEXEC);
-    if (fd >= 0)
-        close(fd);
-}
-
-static void ask_folder(const char* path)
-{
-    struct stat entry;
-    if (lstat(path, &entry) != 0)
-        return;
-}
-
-static void ask_program(const char* path)
-{
-    struct stat entry;
-    if (stat(path, &entry) != 0 || !(entry.st_mode & S_IXUSR))
+    read_file(path);
+    if (mbstowcs(wide, text, PIECE) == (size_t)-1)
         exit(1);
 }
 
@@ -157,16 +94,6 @@ static void make_copies(const char* app, const char* area)
     copy(app, area, "org.eclipse.update/", "platform.xml", 0);
 }
 
-static pid_t start(const char* program)
-{
-    pid_t child = vfork();
-    if (child == 0) {
-        execl(program, program, NULL);
-        _exit(127);
-    }
-    return child;
-}
-
 enum kind { WARM, FIRST, BESIDE };
 
 static void ask_shell(int pid)
@@ -189,12 +116,9 @@ static int begin(const char* app, const char* area, enum kind kind)
     ask_folder(area);
     if (kind == FIRST)
         make_folders(area);
-    int lock = opened(below(area, ".rcp.lock"), O_RDWR | (kind == FIRST ? O_CREAT : 0));
-    if (flock(lock, LOCK_EX) != 0 || access(below(area, ".rcp.lock"), F_OK) != 0 ||
-        (pread(lock, text, PIECE, 0) > 0) == (kind == FIRST))
-        exit(1);
-    int pid = kind == FIRST ? 0 : atoi(text);
-    if (pid > 0 && (kill(pid, 0) == 0) != (kind == BESIDE))
+    int lock = locked(below(area, ".rcp.lock"), kind == FIRST ? O_CREAT : 0);
+    int pid = atoi(text);
+    if ((pid > 0) == (kind == FIRST) || (pid > 0 && (kill(pid, 0) == 0) != (kind == BESIDE)))
         exit(1);
     if (kind == BESIDE)
         ask_shell(pid);
@@ -244,14 +168,6 @@ static int prepare(const char* app, const char* area, const char* program, enum 
     return log;
 }
 
-static void record(const char* area, int lock, pid_t child)
-{
-    ssize_t length = snprintf(text, sizeof text, "%ld          ", (long)child);
-    write_text(below(area, ".rcp.main"), O_TRUNC, text);
-    if (pwrite(lock, text, (size_t)length, 0) != length)
-        exit(1);
-}
-
 int main(int argc, char** argv)
 {
     if (argc < 4 || !setlocale(LC_CTYPE, ""))
@@ -259,9 +175,7 @@ int main(int argc, char** argv)
     enum kind kind = argc == 4 ? WARM : strcmp(argv[4], "first") == 0 ? FIRST : BESIDE;
     const char *app = argv[1], *area = argv[2];
     int lock = begin(app, area, kind), log = prepare(app, area, argv[3], kind);
-    pid_t child = start(argv[3]);
-    if (child < 0)
-        return 1;
+    pid_t child = start((char*[]){argv[3], NULL});
     if (kind != BESIDE)
         record(area, lock, child);
     if (flock(lock, LOCK_UN) != 0)

@@ -9,8 +9,9 @@ REACHED = {True: "reached", False: "**not reached**"}
 
 # Why a target cannot be reached, by the target's key.
 NOTES = {
-    "warm": "Where the least alone comes to the bound or above it, no launcher can reach it.",
-    "first": "As above.",
+    "warm": "Where the least alone comes to the bound or above it, no launcher can reach it. A C program for just this "
+            "start: {native} and {i686}.",
+    "first": "As above, of the least.",
     "calls": "What a program makes that only sets its locale is in the table of counts.",
 }
 
@@ -133,7 +134,8 @@ def target_rows(result):
     the note."""
     for key, what, bound, measured, least in targets(result):
         found = [(measured(build), least(build) if least else None, measured(build) <= bound) for build in WIDTHS]
-        yield what, bound, found, NOTES.get(key, "")
+        plain = {build: figure(ratio(result, "plain-%s-warm" % build, "to_child")) for build in WIDTHS}
+        yield what, bound, found, NOTES.get(key, "").format(**plain)
 
 
 def targets_table(result):
@@ -164,7 +166,7 @@ def tables(result):
     if "disk" in result:
         texts += [disk_table(result), "Flushing costs %s.\n" % flush_price(result)]
     if "counts" in result and {"native-warm", "native-first", "native-fatal", "limit-ps", "dash",
-                               "jpackage", "least-native-warm"} <= set(result["starts"]):
+                               "jpackage", "least-native-warm", "plain-native-warm"} <= set(result["starts"]):
         texts.append(targets_table(result))
     return "\n".join(texts)
 

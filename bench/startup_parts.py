@@ -24,6 +24,8 @@ COMPILED = {
     "floor-i686": ("floor.c", [*SHARED, "-m32"]),
     "least-native": ("least.c", SHARED),
     "least-i686": ("least.c", [*SHARED, "-m32"]),
+    "plain-native": ("plain.c", SHARED),
+    "plain-i686": ("plain.c", [*SHARED, "-m32"]),
     "flush.so": ("flush.c", ["-shared", "-fPIC"]),
 }
 WIDTHS = {"native": [], "i686": ["-m32"]}

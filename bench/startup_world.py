@@ -7,6 +7,7 @@ measurement, and ends all of it.
 import ctypes
 import os
 import pathlib
+import re
 import shutil
 import time
 
@@ -215,6 +216,36 @@ class Least(Contestant):
             raise Failed("%s: it did not come to its end" % self.name)
 
 
+class Plain(Contestant):
+    """A program for just a warm start, in a user area of velmora's: it leaves there what velmora does."""
+    LEFT = ("logs/velmora.log", ".config/args.properties", ".rcp.main", ".rcp.lock")
+
+    def __init__(self, build):
+        self.start = Start(build, "warm", name="plain-%s-warm" % build)
+        super().__init__(self.start.name, "dynamic C program for just %s" % SCENARIOS["warm"],
+                         [PARTS + "/plain-" + build, self.start.command[0]])
+        self.expected = None
+
+    def prepare(self):
+        self.start.prepare()
+        if self.expected is None:
+            World.measure(self.start)
+            self.expected = self._found(arrival()[8:].decode().split("\0")[:-1])
+            self.start.prepare()
+
+    def _found(self, words):
+        """The words, and what the files hold; but for times and the platform's number."""
+        texts = [pathlib.Path(self.start.workspace, name).read_text() for name in self.LEFT]
+        texts = [re.sub(r"@ \d{8}_\d{6}_\d{3}$", "@ then", text, flags=re.M) for text in texts[:2]] + [
+            re.sub(r"^\d+", "N", text) for text in texts[2:]]
+        return words, texts, pathlib.Path(self.start.history).read_text().count("\n")
+
+    def check(self, words):
+        found = self._found(words)
+        if found != self.expected:
+            raise Failed("%s: %r instead of %r" % (self.name, found, self.expected))
+
+
 class World:
     def __init__(self, parts):
         self.first = go_first()
@@ -249,6 +280,7 @@ class World:
             Contestant("floor-native", "dynamic C program, locale set", [PARTS + "/floor-native", child]),
             Contestant("floor-i686", "dynamic C program, locale set", [PARTS + "/floor-i686", child]),
             *(Least(build, scenario) for scenario in ("first", "warm", "beside") for build in ("native", "i686")),
+            *(Plain(build) for build in ("native", "i686")),
             Script("dash", "dash script, four settings", ["/mnt/native/app/rcp/naive.sh"]),
             JavaLauncher("jpackage", "`jpackage` launcher, no package tool on PATH", ["/mnt/java/bin/platform"],
                          PATH="/mnt/no-tools"),
