@@ -32,16 +32,31 @@ static inline int opened(const char* path, int flags)
     return fd;
 }
 
-/* Reads it to its end, which the last piece does not tell. */
-static inline void read_file(const char* path)
+/* Has the file's text, which is shorter than a piece. */
+static inline int open_and_read(const char* path)
 {
     int fd = opened(path, O_RDONLY);
     ssize_t length = read(fd, text, PIECE);
-    char more;
-    if (length < 0 || length == PIECE || read(fd, &more, 1) != 0)
+    if (length < 0 || length == PIECE)
         exit(1);
     text[length] = 0;
+    return fd;
+}
+
+/* Reads it to its end, which the last piece does not tell. */
+static inline void read_file(const char* path)
+{
+    int fd = open_and_read(path);
+    char more;
+    if (read(fd, &more, 1) != 0)
+        exit(1);
     close(fd);
+}
+
+/* Reads the history of starts, whose last piece does tell: it is not full. */
+static inline void read_history(const char* path)
+{
+    close(open_and_read(path));
 }
 
 static inline void put(int fd, const char* words)
@@ -79,11 +94,11 @@ static inline void ask_program(const char* path)
         exit(1);
 }
 
-/* Locks the file, and reads it: what it holds is in `text`. */
+/* Locks the file, which the platform inherits, and reads it: what it holds is in `text`. */
 static inline int locked(const char* path, int flags)
 {
-    int lock = opened(path, O_RDWR | flags);
-    if (flock(lock, LOCK_EX) != 0 || access(path, F_OK) != 0)
+    int lock = open(path, O_RDWR | flags, 0600);
+    if (lock < 0 || flock(lock, LOCK_EX) != 0 || access(path, F_OK) != 0)
         exit(1);
     ssize_t length = pread(lock, text, PIECE, 0);
     if (length < 0)

@@ -131,7 +131,7 @@ static void tell_start(const char* area)
     time_t now = time(NULL);
     strftime(text, PIECE, "Started %c\n", localtime(&now));
     write_text(below(area, "logs/shutdown.log"), O_APPEND, text);
-    read_text(below(area, "logs/shutdown.log"));
+    read_history(below(area, "logs/shutdown.log"));
 }
 
 static int prepare(const char* app, const char* area, const char* program, enum kind kind)

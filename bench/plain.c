@@ -1,7 +1,7 @@
 /*
  * A C program for just one start: the warm start of the example's installation, in the user's
  * locale. It makes the calls of that start, understands what it reads, and leaves what velmora
- * leaves; whatever else it finds ends it.
+ * leaves. Of every other start it knows nothing: it ends it, or gets it wrong.
  *
  *     plain LAUNCHER     the path of the launcher in whose place it stands
  */
@@ -136,7 +136,7 @@ static void tell_start(const char* area)
     struct tm broken;
     strftime(text, PIECE, "Started %c\n", localtime_r(&now, &broken));
     write_text(below(area, "logs/shutdown.log"), O_APPEND, text);
-    read_file(below(area, "logs/shutdown.log"));
+    read_history(below(area, "logs/shutdown.log"));
     size_t count = 0;
     for (const char* end = text; (end = strchr(end, '\n')); end++)
         count++;
@@ -203,6 +203,7 @@ static void say_words(int log)
 
 static void set_environment(void)
 {
+    setenv("JAVA_HIGH_ZIPFDS", "500", 1);
     for (size_t i = 0; i < user.count; i++) {
         const struct pair* one = &user.all[i];
         if (wcsncmp(one->key, L"env.set.", 8) == 0)

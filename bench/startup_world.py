@@ -67,9 +67,15 @@ def remove(path):
 
 
 def arrival():
-    """What was told: the stamp's eight bytes, then the words, each with its end."""
+    """What was told: the stamp's eight bytes, then the words and the environment, each text with its end."""
     with open(STAMP, "rb") as file:
         return file.read()
+
+
+def told():
+    """The words of the platform that has arrived, and its environment."""
+    words, _, environment = arrival()[8:].decode().partition("\0\0")
+    return words.split("\0"), sorted(environment.split("\0")[:-1])
 
 
 def spawn(command, env, *descriptors):
@@ -230,18 +236,18 @@ class Plain(Contestant):
         self.start.prepare()
         if self.expected is None:
             World.measure(self.start)
-            self.expected = self._found(arrival()[8:].decode().split("\0")[:-1])
+            self.expected = self._found()
             self.start.prepare()
 
-    def _found(self, words):
-        """The words, and what the files hold; but for times and the platform's number."""
+    def _found(self):
+        """What the platform was given, and what the files hold; but for times and the platform's number."""
         texts = [pathlib.Path(self.start.workspace, name).read_text() for name in self.LEFT]
         texts = [re.sub(r"@ \d{8}_\d{6}_\d{3}$", "@ then", text, flags=re.M) for text in texts[:2]] + [
             re.sub(r"^\d+", "N", text) for text in texts[2:]]
-        return words, texts, pathlib.Path(self.start.history).read_text().count("\n")
+        return told(), texts, pathlib.Path(self.start.history).read_text().count("\n")
 
     def check(self, words):
-        found = self._found(words)
+        found = self._found()
         if found != self.expected:
             raise Failed("%s: %r instead of %r" % (self.name, found, self.expected))
 
@@ -300,7 +306,7 @@ class World:
         for name in os.listdir("/tmp"):
             remove("/tmp/" + name)
         child, end, cpu, resident, faults, ended, left, failed = watched(contestant, contestant.command)
-        words = arrival()[8:].decode().split("\0")[:-1]
+        words = told()[0]
         if (ended, left, failed, child >= 0) != (contestant.status, contestant.left, 0, contestant.arrives):
             raise Failed("%s: status %d, %d processes left, %d failed, arrival %d" % (
                 contestant.name, ended, left, failed, child))

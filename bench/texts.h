@@ -1,6 +1,6 @@
 /*
  * What plain.c knows of texts: properties, the placeholders in their values, and both conversions.
- * A text stays where it is put until the program ends; one that this cannot treat ends it.
+ * A text stays where it is put until the program ends. ASCII and no escapes: that is what there is.
  */
 #ifndef BENCH_TEXTS_H
 #define BENCH_TEXTS_H
@@ -36,7 +36,7 @@ static inline wchar_t* wide_room(size_t length)
     return room;
 }
 
-/* In every locale that it is measured in, ASCII is itself; other text is not for this program. */
+/* ASCII is itself in the locale of the measurement; other text ends the program. */
 static inline wchar_t* widened(const char* from, size_t length)
 {
     wchar_t* to = wide_room(length);
@@ -57,15 +57,12 @@ static inline wchar_t* widen(const char* from)
 static inline char* narrow(const wchar_t* from)
 {
     char* to = next_narrow;
-    size_t room = (size_t)(narrow_texts + ROOM - to), length = 0;
-    for (; from[length]; length++) {
-        if (length + 1 >= room || from[length] >= 0x80)
-            exit(1);
-        to[length] = (char)from[length];
+    for (; next_narrow < narrow_texts + ROOM && *from < 0x80; from++) {
+        *next_narrow++ = (char)*from;
+        if (!*from)
+            return to;
     }
-    to[length] = 0;
-    next_narrow += length + 1;
-    return to;
+    exit(1);
 }
 
 static inline const wchar_t* joined(const wchar_t* first, const wchar_t* second,
@@ -120,12 +117,11 @@ static inline const wchar_t* resolved(const wchar_t* value)
     return value;
 }
 
-/* The files that this start reads have no escapes. */
 static inline void add_pair(struct pairs* to, wchar_t* line)
 {
-    wchar_t* value = wcspbrk(line, L"=\\");
-    if (to->count == MOST || (value && *value == L'\\'))
+    if (to->count == MOST || wcschr(line, L'\\'))
         exit(1);
+    wchar_t* value = wcschr(line, L'=');
     if (value)
         *value++ = 0;
     to->all[to->count++] = (struct pair){line, value ? value : L""};

@@ -3,11 +3,10 @@
 import datetime
 import os
 import re
-import subprocess
 
 import pytest
 
-from world import CONFIG, ECLIPSE, HOME, JAVA, LOG, WORKSPACE, read, tree, user_logs
+from world import CONFIG, ECLIPSE, HOME, JAVA, LOG, WORKSPACE, read, system_time, tree, user_logs
 
 INHERITED = {"HOME": HOME, "USER": "anna", "LC_ALL": "C.UTF-8", "PATH": "/usr/bin:/bin"}
 LIBRARY = "/mnt/my lib/libx.so"
@@ -208,14 +207,6 @@ def test_a_daemon_process_gives_its_platform_the_same(world):
     assert first.env == second.env == environment(LD_LIBRARY_PATH="/main:/b", A="1")
 
 
-def hours_of_the_system():
-    """What the system's own time zone is ahead of UTC."""
-    words = ["/usr/bin/env", "-u", "TZ", "/usr/bin/date", "+%z"]
-    sign, hours, minutes = re.fullmatch(r"([+-])(\d\d)(\d\d)\n", subprocess.run(
-        words, stdout=subprocess.PIPE, text=True, check=True).stdout).groups()
-    return int(sign + "1") * (int(hours) + int(minutes) / 60)
-
-
 @pytest.mark.parametrize("line, inherited, before, after", [
     ("env.set.TZ=XXX-11", "AAA0", 0, 11),
     ("env.set.TZ=XXX-11", None, None, 11),
@@ -226,7 +217,7 @@ def test_a_time_zone_is_that_of_the_log_from_then_on(world, line, inherited, bef
     started(world, line, env={"TZ": inherited} if inherited else {})
     for hours, text in ((before, "QVMRL0303I: lock file captured"), (after, "QVMRL0306I: lock file released")):
         stamp = re.search(text + r" @ (\d{8}_\d{6})_\d{3}\n", read(LOG)).group(1)
-        here = datetime.datetime.utcnow() + datetime.timedelta(hours=hours_of_the_system() if hours is None else hours)
+        here = system_time() if hours is None else datetime.datetime.utcnow() + datetime.timedelta(hours=hours)
         assert abs(datetime.datetime.strptime(stamp, "%Y%m%d_%H%M%S") - here) < datetime.timedelta(minutes=10), text
 
 

@@ -137,6 +137,7 @@ def test_only_the_first_of_such_an_option_passes_the_next_word_on(world):
     """The word after a repeat is what it always is."""
     world.install()
     world.run("-product", "a", "-product", "-data", "/mnt/w", "-x")
+    world.all_ended()
     world.run("-personality", "a", "-personality", "-vmargs", "-Xa", "-data", "/mnt/v")
     assert [platform.argv for platform in world.platforms()] == [
         HEAD + ["-product", "a", "-product", "-x"] + areas("/mnt/w") + STARTUP + system("/mnt/w") + INSTALL_AREA,

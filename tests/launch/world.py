@@ -5,6 +5,7 @@ anna, number 1000. The platform and the JVM are stand-ins that record what they 
 """
 
 import contextlib
+import datetime
 import os
 import pathlib
 import re
@@ -68,6 +69,13 @@ def system(workspace=WORKSPACE, configuration="user"):
 def untimed(text):
     """The text with <time> for every time stamp of the log."""
     return re.sub(r"\b\d{8}_\d{6}_\d{3}\b", "<time>", text)
+
+
+def system_time():
+    """The time in the system's own zone, whatever that of the test is: no TZ is handed to a start."""
+    zone = subprocess.run(["/usr/bin/env", "-u", "TZ", "/usr/bin/date", "+%z"], stdout=subprocess.PIPE, text=True,
+                          check=True).stdout
+    return datetime.datetime.now(datetime.datetime.strptime(zone, "%z\n").tzinfo).replace(tzinfo=None)
 
 
 def until(condition, what, within=20):
