@@ -132,9 +132,9 @@ def targets(result):
 def target_rows(result):
     """Of every target: what it says, and the bound; for each width the figure, the least, and whether it is reached;
     the note."""
+    plain = {build: figure(ratio(result, "plain-%s-warm" % build, "to_child")) for build in WIDTHS}
     for key, what, bound, measured, least in targets(result):
         found = [(measured(build), least(build) if least else None, measured(build) <= bound) for build in WIDTHS]
-        plain = {build: figure(ratio(result, "plain-%s-warm" % build, "to_child")) for build in WIDTHS}
         yield what, bound, found, NOTES.get(key, "").format(**plain)
 
 

@@ -190,10 +190,11 @@ def test_a_home_that_is_given_and_empty_is_kept(world, users):
     assert shown(world) == ["-Dhome=", "-Droot=/mnt/app/rcp/deploy/"]
 
 
-def test_a_home_that_is_given_is_not_even_computed(world):
+@pytest.mark.parametrize("home", ["/mnt/mine", ""])
+def test_a_home_that_is_given_is_not_even_computed(world, home):
     """The trace would show the pair that is added."""
     world.install()
-    world.jvm_properties("java.home=/mnt/mine")
+    world.jvm_properties("java.home=" + home)
     world.run("-debug")
     log = read(user_logs()[0])
     assert 'QVMRL0126I:   key = "jvm.root"\n' in log

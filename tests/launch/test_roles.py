@@ -9,8 +9,7 @@ import time
 import pytest
 
 from world import (BASE, CONFIG, ECLIPSE, HEAD, INSTALL_AREA, LOCK, LOG, MAIN, STARTUP, TEMP_LOG, WORKSPACE, areas,
-                   lines, read, read_bytes, state, system, system_time, temp_logs, until,
-                   untimed)
+                   lines, read, read_bytes, state, system, system_time, temp_logs, until, untimed)
 
 BAD_LOCK = "QVMRL0092E: Error reading platform lock file."
 MAIN_LINE = "QVMRL0304I: We are main process\n"
