@@ -90,40 +90,62 @@ static void reportFailure(std::string& report, const char* what, const std::stri
     report += what + path + "  - " + reason + "\n";
 }
 
-static bool removeEntry(const std::string& full, const char* name, const std::string& pattern,
-                        const std::string& indent, std::string& report)
+// Decision: a removal enters at most so many directories through links, so that it comes to an
+// end. A link behind them is only tried itself, like one whose directory has been emptied. One link
+// that leads back up is followed until the system refuses, forty levels deep; of two, each level
+// would follow both.
+static const int MOST_LINKS_ENTERED = 10000;
+
+struct Removal {
+    const std::string& pattern;
+    std::string& report;
+    int linksEntered = 0;
+};
+
+static bool removeContents(Removal& removal, const std::string& dir, const std::string& indent);
+
+// The directory itself, and no link to it.
+static bool isItself(const std::string& dir)
 {
-    const bool everything = pattern == "*";
+    struct stat entry = {};
+    return lstat(dir.c_str(), &entry) == 0 && S_ISDIR(entry.st_mode);
+}
+
+static bool removeEntry(Removal& removal, const std::string& full, const char* name,
+                        const std::string& indent)
+{
+    const bool everything = removal.pattern == "*";
     struct stat entry = {};
     if (stat(full.c_str(), &entry) != 0) {
-        reportFailure(report, "Can't stat ", full);
+        reportFailure(removal.report, "Can't stat ", full);
         return false;
     }
     if (!S_ISDIR(entry.st_mode)) {
-        if (!everything && std::string(name).find(pattern) == std::string::npos)
+        if (!everything && std::string(name).find(removal.pattern) == std::string::npos)
             return true;
         if (unlink(full.c_str()) == 0)
             return true;
-        reportFailure(report, "Can't delete file ", full);
+        reportFailure(removal.report, "Can't delete file ", full);
         return false;
     }
     if (!everything)
         return true;
-    bool ok = removeDirectoryContents(full, pattern, indent + "  ", report);
+    bool ok = true;
+    if (isItself(full) || removal.linksEntered++ < MOST_LINKS_ENTERED)
+        ok = removeContents(removal, full, indent + "  ");
     // A directory that could not be emptied is tried as well, and is in the report twice over.
     if (rmdir(full.c_str()) != 0) {
-        reportFailure(report, "Can't delete dir ", full);
+        reportFailure(removal.report, "Can't delete dir ", full);
         ok = false;
     }
     return ok;
 }
 
-bool removeDirectoryContents(const std::string& dir, const std::string& pattern,
-                             const std::string& indent, std::string& report)
+static bool removeContents(Removal& removal, const std::string& dir, const std::string& indent)
 {
     DIR* entries = opendir(dir.c_str());
     if (entries == nullptr) {
-        reportFailure(report, "Error in ", dir);
+        reportFailure(removal.report, "Error in ", dir);
         return false;
     }
     bool ok = true;
@@ -131,16 +153,23 @@ bool removeDirectoryContents(const std::string& dir, const std::string& pattern,
     while (const struct dirent* entry = readdir(entries)) {
         const std::string name = entry->d_name;
         if (name != "." && name != ".." &&
-            !removeEntry(dir + "/" + name, name.c_str(), pattern, indent, report))
+            !removeEntry(removal, dir + "/" + name, name.c_str(), indent))
             ok = false;
         errno = 0;
     }
     if (errno != 0) {
-        reportFailure(report, "readdir error ", "");
+        reportFailure(removal.report, "readdir error ", "");
         ok = false;
     }
     closedir(entries);
     return ok;
+}
+
+bool removeDirectoryContents(const std::string& dir, const std::string& pattern,
+                             const std::string& indent, std::string& report)
+{
+    Removal removal{pattern, report};
+    return removeContents(removal, dir, indent);
 }
 
 bool removeDirectoryContents(const std::string& dir, const std::string& indent, std::string& report)

@@ -18,8 +18,9 @@ bool ensureDirectory(const wchar_t* path);
 
 /// Removes from `dir` every entry when `pattern` is exactly "*", sub-directories with all they
 /// hold included; otherwise the plain files of `dir` itself whose names contain `pattern`. Links
-/// are followed. Goes on after every failure and adds a line to `report` for each, in the order
-/// met, depth first. True when there was none. `indent` is handed down and written nowhere.
+/// are followed, into at most 10,000 directories. Goes on after every failure and adds a line to
+/// `report` for each, in the order met, depth first. True when there was none. `indent` is handed
+/// down and written nowhere.
 bool removeDirectoryContents(const std::string& dir, const std::string& pattern,
                              const std::string& indent, std::string& report);
 

@@ -285,6 +285,19 @@ def test_when_no_name_is_free_the_start_ends(world):
                            "bookmarks.xml.old": BOOKMARKS}
 
 
+def test_links_that_lead_back_do_not_hold_a_start(world):
+    """A folder behind a link is emptied, in forty levels of it. Two such links would be followed for days."""
+    old = old_area(world)
+    world.write(BACKUP + "/older", "older\n")
+    for name in ("one", "other"):
+        os.symlink(".", BACKUP + "/" + name)
+    install(world, "new")
+    assert world.run().status == 0
+    aside = {".configbakdeleteme0001/": None, ".configbakdeleteme0001/one": "-> .",
+             ".configbakdeleteme0001/other": "-> ."}
+    assert workspace() == renewed(old, more=aside)
+
+
 def test_a_backup_that_cannot_be_removed_stays_aside(world):
     """Silently; the next one that is in the way clears it, when it can be."""
     old = old_area(world)

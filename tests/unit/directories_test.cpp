@@ -254,6 +254,43 @@ TEST(removeDirectoryContents, EmptiesTheDirectoryBehindALinkAndCannotRemoveTheLi
     EXPECT_EQ(pathsIn(dir.dir), (Paths{"other", "top", "top/link"}));
 }
 
+// The system follows 40 links of one path. It may refuse earlier, when something is mounted anywhere
+// while it looks: it then begins again, and goes on counting.
+TEST(removeDirectoryContents, FollowsALinkThatLeadsBackUntilTheSystemRefuses)
+{
+    TempDir dir;
+    dir.write("top/file", "");
+    linkTo(".", dir.path("top/back"));
+    std::string report;
+    EXPECT_FALSE(removeDirectoryContents(dir.path("top"), "*", "", report));
+    const std::string last = line("Can't delete dir " + dir.path("top/back"), NO_DIRECTORY);
+    EXPECT_EQ(report.compare(0, 11, "Can't stat "), 0);
+    EXPECT_NE(report.find("/back  -  Failed with error 40: Too many levels of symbolic links\n"),
+              std::string::npos);
+    EXPECT_EQ(report.substr(report.size() - std::min(report.size(), last.size())), last);
+    EXPECT_LE(std::count(report.begin(), report.end(), '\n'), 41);
+    EXPECT_EQ(pathsIn(dir.path("top")), Paths{"back"});
+}
+
+// Followed to the end, these would be 2 to the 40th directories.
+TEST(removeDirectoryContents, DecisionEntersTenThousandDirectoriesThroughLinks)
+{
+    TempDir dir;
+    dir.write("top/file", "");
+    dir.write("top/sub/file", "");
+    linkTo(".", dir.path("top/back"));
+    linkTo("..", dir.path("top/sub/up"));
+    std::string report;
+    EXPECT_FALSE(removeDirectoryContents(dir.path("top"), "*", "", report));
+    EXPECT_EQ(pathsIn(dir.path("top")), (Paths{"back", "sub", "sub/up"}));
+    // Every link leads to the top, which is entered 10,001 times. Each time there is a line for
+    // each of the links, and one for the directory that is none and stands in no limit. Where the
+    // system refuses a link early, there are fewer.
+    const auto lines = std::count(report.begin(), report.end(), '\n');
+    EXPECT_LE(lines, 30003);
+    EXPECT_GE(lines, 29800);
+}
+
 TEST(removeDirectoryContents, ReportsALinkThatLeadsNowhereWhateverThePattern)
 {
     TempDir dir;
