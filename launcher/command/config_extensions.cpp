@@ -14,6 +14,8 @@ static wchar_t PB4L[] = L"-pb4l";
 static wchar_t DEBUG_FILE[] = L"-debugFile";
 
 // The index of the word behind "-config", -1 when it is absent or last.
+// Decision: it is looked for among the words as received, so a named argument that stands there is
+// the extension's name, too.
 static int extensionNameIndex(int argc, wchar_t** argv)
 {
     const int option = findOption(L"-config", argc, argv);

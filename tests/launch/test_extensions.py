@@ -116,6 +116,19 @@ def test_the_name_may_be_any_word(world):
     assert started(world, "-config", "-vmargs", "-x") == command("-x", "-odd")
 
 
+def test_the_name_may_be_a_named_argument(world):
+    """The word as it was received is the name, and it is a named argument as well."""
+    world.install("user", *extension("-of-x", name="x"))
+    assert started(world, "-config", "vmarg.a=-A", "x") == command("x", jvm=["-A"])
+
+
+def test_a_named_argument_behind_config_keeps_it_from_being_last(world):
+    """So the marker file is not looked for."""
+    world.install("user")
+    world.write("/mnt/app/rcp/prov.debug/debug.txt", "")
+    assert started(world, "-config", "vmarg.a=-A") == command(jvm=["-A"])
+
+
 # ---- named JVM arguments
 
 def test_named_jvm_arguments_of_the_line_win(world):
